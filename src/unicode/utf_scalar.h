@@ -1,0 +1,93 @@
+// The scalar UTF-8 <-> UTF-16 steps. The reference loops and the vector fast
+// paths share them, so every input the fast paths do not take whole is
+// handled by exactly this code.
+#pragma once
+
+#include <cstdint>
+
+#include "textconv.h"
+#include "unicode/utf_tables.h"
+
+namespace textconv {
+
+// Outcome of one step: go on, or stop with a result code.
+inline constexpr uint32_t kStepContinue = 0xFFFFFFFFu;
+
+// Decodes the sequence at src[p] (p < len) into dst, advancing p and w (bytes
+// written; w never exceeds cap, and cap may be odd). Returns kStepContinue or TEXTCONV_UTF_SOURCE_INCOMPLETE
+// / TEXTCONV_UTF_TARGET_FULL.
+inline uint32_t utf8_decode_step(const uint8_t *src, uint32_t len, uint32_t &p, uint16_t *dst, uint32_t cap,
+                                 uint32_t &w) {
+    const uint32_t lead = src[p];
+    const uint32_t t = static_cast<uint32_t>(utf8TrailingByteCount[lead]);
+    const uint32_t avail = len - p - 1;  // bytes after the lead
+    // A trailing byte must look like one (10xxxxxx). Check those that are
+    // there first: a sequence broken by another byte is illegal at once, one
+    // that only runs past the end is incomplete.
+    const uint32_t seen = t < avail ? t : avail;
+    for (uint32_t k = 1; k <= seen; ++k) {
+        if ((src[p + k] & 0xC0) != 0x80) {
+            if (cap - w < 2) return TEXTCONV_UTF_TARGET_FULL;
+            dst[w / 2] = kReplacementCharacter;
+            w += 2;
+            p += 1;  // resume right after the lead byte
+            return kStepContinue;
+        }
+    }
+    if (t > avail) return TEXTCONV_UTF_SOURCE_INCOMPLETE;
+
+    uint32_t v = lead;
+    for (uint32_t k = 1; k <= t; ++k) v = (v << 6) + src[p + k];
+    v -= utf8OffsetByLength[t];
+
+    if (v < utf8MinimumByLength[t] || v > utf8MaximumByLength[t] || (v >= 0xD800 && v <= 0xDFFF)) {
+        if (cap - w < 2) return TEXTCONV_UTF_TARGET_FULL;
+        dst[w / 2] = kReplacementCharacter;
+        w += 2;
+        p += 1;  // the trailing bytes are decoded again on their own
+        return kStepContinue;
+    }
+    p += t + 1;
+    if (v <= 0xFFFF) {
+        if (cap - w < 2) return TEXTCONV_UTF_TARGET_FULL;
+        dst[w / 2] = static_cast<uint16_t>(v);
+        w += 2;
+    } else if (v <= 0x10FFFF) {
+        if (cap - w < 4) return TEXTCONV_UTF_TARGET_FULL;
+        v -= 0x10000;
+        dst[w / 2] = static_cast<uint16_t>(0xD800 + (v >> 10));
+        dst[w / 2 + 1] = static_cast<uint16_t>(0xDC00 + (v & 0x3FF));
+        w += 4;
+    } else {
+        if (cap - w < 2) return TEXTCONV_UTF_TARGET_FULL;
+        dst[w / 2] = kReplacementCharacter;  // beyond Unicode: the whole sequence is consumed
+        w += 2;
+    }
+    return kStepContinue;
+}
+
+// Encodes the unit (or pair) at src[r / 2] (r < len, in bytes) into dst.
+inline uint32_t utf16_encode_step(const uint16_t *src, uint32_t len, uint32_t &r, uint8_t *dst, uint32_t cap,
+                                  uint32_t &w) {
+    uint32_t u = src[r / 2];
+    r += 2;
+    if (u >= 0xD800 && u <= 0xDBFF && r < len) {
+        const uint32_t next = src[r / 2];
+        if (next >= 0xDC00 && next <= 0xDFFF) {
+            r += 2;
+            u = ((u - 0xD800) << 10) + (next - 0xDC00) + 0x10000;
+        }
+    }
+    const uint32_t n = u < 0x80 ? 1 : u < 0x800 ? 2 : u < 0x10000 ? 3 : 4;
+    if (n > cap - w) return TEXTCONV_UTF_TARGET_FULL;  // w never exceeds cap
+    uint8_t *out = dst + w;
+    w += n;
+    for (uint32_t i = n - 1; i > 0; --i) {
+        out[i] = static_cast<uint8_t>(0x80 | (u & 0x3F));
+        u >>= 6;
+    }
+    out[0] = static_cast<uint8_t>(u | utf8LeadByteMark[n]);
+    return kStepContinue;
+}
+
+}  // namespace textconv
