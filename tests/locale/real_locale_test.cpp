@@ -1,0 +1,122 @@
+// The detection under real glibc locales (reached through LOCPATH), with the
+// reference host's lookup. glibc reports codesets such as "EUC-JP" and
+// "ISO-8859-1" that the charsets table does not hold, so for those the locale
+// name and the tables decide.
+#include <gtest/gtest.h>
+#include <langinfo.h>
+
+#include <clocale>
+#include <cstdlib>
+#include <string>
+
+#include "charset_agreement.h"
+#include "textconv.h"
+
+namespace {
+
+struct RealCase {
+    const char *lang;
+    CharsetId id;
+    // The locale's codeset is the charset the id names: glibc's converters for
+    // both decode every short sequence alike.
+    bool sameCharset;
+    const char *loaded = nullptr;  // the name glibc keeps, when not lang
+};
+
+void PrintTo(const RealCase &c, std::ostream *os) { *os << c.lang; }
+
+std::string label(const char *lang) {
+    std::string s;
+    for (const char *p = lang; *p; ++p) s += std::isalnum(static_cast<unsigned char>(*p)) ? *p : '_';
+    return s;
+}
+
+void start_with_lang(const char *lang) {
+    unsetenv("LC_ALL");
+    unsetenv("LC_CTYPE");
+    setenv("LANG", lang, 1);
+}
+
+class RealLocale : public ::testing::TestWithParam<RealCase> {};
+
+TEST_P(RealLocale, LocalEncoding) {
+    const RealCase &c = GetParam();
+    ASSERT_NE(std::getenv("LOCPATH"), nullptr) << "run through ctest: the locales come from a fixture";
+    start_with_lang(c.lang);
+    const CharsetId id = LocalEncoding();
+    // The locale really loaded: glibc keeps the name it was given.
+    ASSERT_STREQ(std::setlocale(LC_CTYPE, nullptr), c.loaded ? c.loaded : c.lang) << "locale not built?";
+    EXPECT_EQ(id, c.id) << "codeset " << nl_langinfo(CODESET);
+    EXPECT_EQ(LocalEncoding(), id);
+    EXPECT_STREQ(std::getenv("LANG"), c.lang);
+    EXPECT_EQ(std::getenv("LC_ALL"), nullptr);
+    if (c.sameCharset) {
+        auto agreement = localetest::compare_decoders(nl_langinfo(CODESET), charsetConversion[id].iconvName);
+        ASSERT_TRUE(agreement.has_value());
+        EXPECT_GT(agreement->compared, 100u);
+        EXPECT_EQ(agreement->differing.size(), 0u);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Locales, RealLocale,
+    ::testing::Values(
+        RealCase{"C", CHARSET_LATIN1, false}, RealCase{"POSIX", CHARSET_LATIN1, false, "C"},
+        RealCase{"C.UTF-8", CHARSET_UTF8, true}, RealCase{"en_US.ISO-8859-1", CHARSET_LATIN1, true},
+        RealCase{"en_US.ISO8859-1", CHARSET_LATIN1, true}, RealCase{"en_US", CHARSET_LATIN1, true},
+        RealCase{"de_DE.ISO-8859-1", CHARSET_LATIN1, true}, RealCase{"fr_FR", CHARSET_LATIN1, true},
+        RealCase{"en_US.UTF-8", CHARSET_UTF8, true}, RealCase{"en_US.utf8", CHARSET_UTF8, true},
+        RealCase{"en_US.ISO-8859-15", CHARSET_ISO8859_15, true}, RealCase{"ja_JP.eucJP", CHARSET_EUCJP, true},
+        RealCase{"ja_JP", CHARSET_EUCJP, true}, RealCase{"ja_JP.SJIS", CHARSET_SJIS, true},
+        RealCase{"ja_JP.UTF-8", CHARSET_UTF8, true}, RealCase{"ru_RU.KOI8-R", CHARSET_KOI8R, true},
+        RealCase{"ru_RU.koi8r", CHARSET_KOI8R, true}, RealCase{"he_IL", CHARSET_ISO8859_8, true},
+        RealCase{"he_IL.ISO-8859-8", CHARSET_ISO8859_8, true}, RealCase{"zh_CN", CHARSET_GB2312, true},
+        RealCase{"zh_CN.GBK", CHARSET_GBK, true}, RealCase{"zh_CN.GB18030", CHARSET_GB18030, true},
+        RealCase{"zh_TW", CHARSET_BIG5, true}, RealCase{"zh_HK", CHARSET_BIG5HKSCS, true},
+        RealCase{"ko_KR.eucKR", CHARSET_EUCKR, true}, RealCase{"th_TH", CHARSET_ISO8859_11, true},
+        RealCase{"ar_EG", CHARSET_ISO8859_6, true}, RealCase{"ar_EG.UTF-8", CHARSET_UTF8, true},
+        RealCase{"ar_IN", CHARSET_UTF8, true}, RealCase{"pl_PL", CHARSET_ISO8859_2, true},
+        // Charsets the registry lacks: the default.
+        RealCase{"tr_TR", CHARSET_LATIN1, false}, RealCase{"ru_RU", CHARSET_LATIN1, false}),
+    [](const ::testing::TestParamInfo<RealCase> &info) { return label(info.param.lang); });
+
+// A locale glibc cannot load leaves the process in "C": the default, and
+// the environment as it was.
+TEST(RealLocaleMissing, GivesTheDefault) {
+    start_with_lang("xx_YY.UTF-8");
+    EXPECT_EQ(LocalEncoding(), CHARSET_LATIN1);
+    EXPECT_STREQ(std::setlocale(LC_CTYPE, nullptr), "C");
+    EXPECT_STREQ(std::getenv("LANG"), "xx_YY.UTF-8");
+}
+
+// With the switch on, a ".utf8" locale is applied again under its canonical
+// name, which glibc loads as well.
+TEST(RealLocaleRewrite, SwitchOn) {
+    start_with_lang("en_US.utf8");
+    EXPECT_EQ(SetCurrentLocale(1), CHARSET_UTF8);
+    EXPECT_STREQ(std::getenv("LANG"), "en_US.UTF-8");
+    EXPECT_STREQ(std::getenv("LC_ALL"), "en_US.UTF-8");
+    EXPECT_STREQ(std::setlocale(LC_CTYPE, nullptr), "en_US.UTF-8");
+    EXPECT_STREQ(std::setlocale(LC_MESSAGES, nullptr), "en_US.UTF-8");
+    EXPECT_STREQ(nl_langinfo(CODESET), "UTF-8");
+    EXPECT_EQ(LocalEncoding(), CHARSET_UTF8);
+}
+
+TEST(RealLocaleRewrite, SwitchOff) {
+    start_with_lang("en_US.utf8");
+    EXPECT_EQ(SetCurrentLocale(0), CHARSET_UTF8);
+    EXPECT_STREQ(std::getenv("LANG"), "en_US.utf8");
+    EXPECT_EQ(std::getenv("LC_ALL"), nullptr);
+    EXPECT_STREQ(std::setlocale(LC_CTYPE, nullptr), "en_US.utf8");
+}
+
+// The switch set after the first detection changes nothing.
+TEST(RealLocaleRewrite, SwitchTooLate) {
+    start_with_lang("ar_EG.utf8");
+    EXPECT_EQ(LocalEncoding(), CHARSET_UTF8);
+    EXPECT_EQ(SetCurrentLocale(1), CHARSET_UTF8);
+    EXPECT_STREQ(std::getenv("LANG"), "ar_EG.utf8");
+    EXPECT_EQ(std::getenv("LC_ALL"), nullptr);
+}
+
+}  // namespace
