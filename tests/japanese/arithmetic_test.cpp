@@ -1,0 +1,196 @@
+// Shift-JIS <-> JIS row/cell arithmetic and the Shift-JIS to EUC-JP string
+// conversion: exhaustive over every two-byte sequence, glibc as oracle.
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <random>
+#include <set>
+
+#include "japanese_test_util.h"
+#include "test_support.h"
+#include "textconv.h"
+
+using testsupport::hex;
+
+namespace {
+
+bool single(unsigned b) { return (b >= 0x20 && b <= 0x7E) || (b >= 0xA1 && b <= 0xDF); }
+bool lead(unsigned b) { return (b >= 0x81 && b <= 0x9F) || (b >= 0xE0 && b <= 0xEF); }
+bool trail(unsigned b) { return (b >= 0x40 && b <= 0x7E) || (b >= 0x80 && b <= 0xFC); }
+
+std::string sjis_to_eucjp(const std::string &sjis, uint32_t capacity, int *result) {
+    std::string out(capacity + 8, '\xEE');
+    uint32_t length = capacity;
+    *result = StringFromSJISToEUCJP(sjis.c_str(), out.data(), &length);
+    for (size_t i = capacity; i < out.size(); ++i)
+        if (out[i] != '\xEE') ADD_FAILURE() << "wrote past capacity " << capacity << " for " << hex(sjis);
+    if (capacity == 0) return length == 0 ? "" : "bad length";
+    EXPECT_EQ(out[length - 1], '\0');
+    return out.substr(0, length - 1);
+}
+
+}  // namespace
+
+// Every first/second byte pair: singles, valid double-byte codes (a bijection
+// onto the 94 x 94 rows and cells that FromJisToSJis inverts and glibc's
+// SJIS -> EUC-JP agrees with wherever it maps), and everything else rejected
+// without a write. A lead byte with a bad trail byte is invalid on its own.
+TEST(ShiftJisJis, EveryTwoByteSequence) {
+    jptest::Oracle glibc("EUC-JP", "SJIS");
+    std::set<std::pair<int, int>> rowCells;
+    int glibcMapped = 0;
+    for (unsigned b0 = 1; b0 < 0x100; ++b0) {
+        for (unsigned b1 = 0; b1 < 0x100; ++b1) {
+            const char bytes[3] = {static_cast<char>(b0), static_cast<char>(b1), 0};
+            uint8_t kind = 0xEE, consumed = 0xEE;
+            JisCode jis = {{0xEE, 0xEE}};
+            const int ok = FromSJisToJis(bytes, &kind, &jis, &consumed);
+            SCOPED_TRACE(hex(std::string(bytes, 2)));
+            if (single(b0)) {
+                ASSERT_TRUE(ok && kind == MB_KIND_SINGLE && consumed == 1 && jis.byte[0] == b0);
+            } else if (lead(b0) && trail(b1)) {
+                ASSERT_TRUE(ok && kind == MB_KIND_JISX0208 && consumed == 2);
+                rowCells.insert({jis.byte[0], jis.byte[1]});
+                char back[2];
+                uint8_t length = 0;
+                ASSERT_TRUE(FromJisToSJis(MB_KIND_JISX0208, &jis, back, &length));
+                ASSERT_EQ(std::string(back, length), std::string(bytes, 2));
+                if (auto euc = glibc(std::string(bytes, 2))) {
+                    ++glibcMapped;
+                    const char expected[2] = {static_cast<char>(jis.byte[0] + 0xA0),
+                                              static_cast<char>(jis.byte[1] + 0xA0)};
+                    ASSERT_EQ(*euc, std::string(expected, 2));
+                }
+            } else {
+                ASSERT_TRUE(!ok && kind == 0xEE && consumed == 0xEE && jis.byte[0] == 0xEE &&
+                            jis.byte[1] == 0xEE);
+            }
+        }
+    }
+    EXPECT_EQ(rowCells.size(), 94u * 94u);
+    EXPECT_EQ(rowCells.begin()->first, 1);
+    EXPECT_EQ(rowCells.rbegin()->second, 94);
+    EXPECT_GT(glibcMapped, 6800);
+}
+
+// FromJisToSJis accepts exactly kinds 1 and 2 with in-range codes and writes
+// nothing otherwise.
+TEST(ShiftJisJis, JisToShiftJisRange) {
+    for (uint32_t kind = 0; kind <= 7; ++kind) {
+        for (unsigned b0 = 0; b0 < 0x100; ++b0) {
+            for (unsigned b1 = 0; b1 < 0x100; b1 += (kind == MB_KIND_JISX0208 ? 1 : 51)) {
+                const JisCode jis = {{static_cast<uint8_t>(b0), static_cast<uint8_t>(b1)}};
+                char out[2] = {'\xEE', '\xEE'};
+                uint8_t length = 0xEE;
+                const bool valid = (kind == MB_KIND_SINGLE && single(b0)) ||
+                                   (kind == MB_KIND_JISX0208 && b0 >= 1 && b0 <= 94 && b1 >= 1 && b1 <= 94);
+                ASSERT_EQ(FromJisToSJis(kind, &jis, out, &length), valid ? 1 : 0)
+                    << kind << " " << b0 << " " << b1;
+                if (!valid) {
+                    ASSERT_TRUE(out[0] == '\xEE' && length == 0xEE);
+                }
+            }
+        }
+    }
+}
+
+// Real text (split at control characters, which are invalid here) converts
+// as glibc converts it.
+TEST(ShiftJisToEucJp, CorpusAgreesWithGlibc) {
+    jptest::Oracle glibc("EUC-JP", "SJIS");
+    for (const std::string &file : testsupport::corpus_files(".sjis.txt")) {
+        auto text = testsupport::read_corpus(file);
+        if (!text) {
+            GTEST_SKIP() << "no corpora";
+        }
+        for (const std::string &piece : jptest::split_on_controls(*text)) {
+            auto expected = glibc(piece);
+            ASSERT_TRUE(expected) << file << ": " << hex(piece);
+            int result;
+            ASSERT_EQ(sjis_to_eucjp(piece, 2 * piece.size() + 1, &result), *expected) << file;
+            ASSERT_EQ(result, 1);
+        }
+    }
+}
+
+// Every capacity of random valid text: the output is the longest prefix that
+// fits at a character boundary, and nothing is written past the capacity.
+TEST(ShiftJisToEucJp, EveryCapacity) {
+    std::mt19937 rng(7);
+    for (int round = 0; round < 40; ++round) {
+        std::string sjis;
+        for (int i = 0; i < 12; ++i) {
+            switch (rng() % 3) {
+                case 0:
+                    sjis += static_cast<char>(0x20 + rng() % 0x5F);
+                    break;
+                case 1:
+                    sjis += static_cast<char>(0xA1 + rng() % 63);
+                    break;
+                default:
+                    sjis += static_cast<char>(0x81 + rng() % 31);
+                    sjis += static_cast<char>(0x40 + rng() % 63);
+            }
+        }
+        int result;
+        const std::string full = sjis_to_eucjp(sjis, 2 * sjis.size() + 1, &result);
+        for (uint32_t capacity = 0; capacity <= full.size() + 1; ++capacity) {
+            const std::string part = sjis_to_eucjp(sjis, capacity, &result);
+            EXPECT_EQ(result, 1);
+            ASSERT_EQ(full.compare(0, part.size(), part), 0);
+            const size_t room = capacity ? capacity - 1 : 0;
+            // Cut only where the next character (1 or 2 bytes) does not fit.
+            if (part.size() < full.size()) {
+                const bool twoBytes = static_cast<unsigned char>(full[part.size()]) >= 0x80;
+                ASSERT_GT(part.size() + (twoBytes ? 2 : 1), room) << capacity;
+            }
+        }
+    }
+}
+
+// Invalid bytes become one space each and never take an ASCII byte with them.
+TEST(ShiftJisToEucJp, InvalidBytes) {
+    const struct {
+        const char *in, *out;
+    } cases[] = {
+        {"A\tB", "A B"},
+        {"\x88", " "},
+        {"\x81\x3F", " ?"},
+        {"\x81\"x", " \"x"},
+        {"\x81<\x82\xA0", " <\xA4\xA2"},
+        {"\x80\xA0\xF0\xFF", "    "},
+        {"\x81\x7F", "  "},
+        {"\xEF\xFD", "  "},
+    };
+    for (const auto &c : cases) {
+        int result;
+        EXPECT_EQ(sjis_to_eucjp(c.in, 64, &result), c.out) << hex(c.in);
+        EXPECT_EQ(result, 0);
+    }
+}
+
+// The conversion into a new buffer on an EUC-JP device (a real ja_JP.EUC-JP
+// locale through LOCPATH).
+TEST(StringToCurrentEncoding, EucJpDevice) {
+    setenv("LC_ALL", "ja_JP.eucJP", 1);  // glibc reports "EUC-JP"; the name says "eucJP"
+    ASSERT_EQ(LocalEncoding(), CHARSET_EUCJP);
+    for (const char *sjis : {"", "A\xB1\x88\x9F", "\x82\xA0\xB6\xC5 ok"}) {
+        char *converted = nullptr;
+        ASSERT_EQ(StringToCurrentEncoding(sjis, &converted), 1);
+        EXPECT_NE(converted, sjis);
+        EXPECT_EQ(std::string(converted), *testsupport::iconv_convert("EUC-JP", "SJIS", sjis));
+        Mem_free(1, converted);
+    }
+    const char *bad = "A\tB";
+    char *same = nullptr;
+    EXPECT_EQ(StringToCurrentEncoding(bad, &same), 0);
+    EXPECT_EQ(same, bad);
+}
+
+TEST(StringToCurrentEncoding, OtherDeviceHandsBackTheInput) {
+    setenv("LC_ALL", "ja_JP.SJIS", 1);
+    const char *sjis = "\x82\xA0";
+    char *same = nullptr;
+    EXPECT_EQ(StringToCurrentEncoding(sjis, &same), 0);
+    EXPECT_EQ(same, sjis);
+}
