@@ -184,17 +184,20 @@ TEXTCONV_API CharsetId LocalEncoding(void);
 TEXTCONV_API CharsetId SetCurrentLocale(uint32_t rewrite);
 
 /* The CharsetId that the tables give for a locale name: its charset part,
- * then the whole name, then its language (whose default is CHARSET_LATIN1). */
+ * then the whole name, then its language (whose default is CHARSET_LATIN1).
+ * A null name, or no memory to copy the language, gives that default. */
 TEXTCONV_API CharsetId find_charset_from(const char *name);
 
-/* A pointer into name just past its last ".", or null when it has none. */
+/* A pointer into name just past its last ".", or null when it has none (or
+ * name is null). */
 TEXTCONV_API const char *get_charset_from_locale(const char *name);
 
 /* A new copy of name (release with free), cut at its first "_"; null when
- * memory is exhausted. */
+ * memory is exhausted or name is null. */
 TEXTCONV_API char *get_language_from_locale(const char *name);
 
-/* Sets LANG and LC_ALL to name, then calls setlocale(LC_ALL, ""). */
+/* Sets LANG and LC_ALL to name, then calls setlocale(LC_ALL, ""). Does
+ * nothing when name is null. */
 TEXTCONV_API void apply_locale_name(const char *name);
 
 /* ===================================================================== */
