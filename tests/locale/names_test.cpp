@@ -125,8 +125,6 @@ TEST(FindCharsetFrom, Cases) {
     for (const auto &c : cases) EXPECT_EQ(find_charset_from(c.name), c.id) << '"' << c.name << '"';
 }
 
-TEST(FindCharsetFrom, NullNameGivesTheDefault) { EXPECT_EQ(find_charset_from(nullptr), CHARSET_LATIN1); }
-
 TEST(LocaleNameParts, CharsetPartPointsIntoTheName) {
     const struct {
         const char *name;
