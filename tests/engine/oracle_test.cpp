@@ -1,0 +1,358 @@
+// The charset engine against glibc iconv: every byte of the single-byte
+// charsets, every double-byte code of the CJK charsets, random and real text,
+// substitutes, and the caller's room.
+#include <random>
+
+#include "engine_checks.h"
+#include "test_support.h"
+
+using namespace enginetest;
+
+namespace {
+
+const char *name_of(CharsetId charset) { return charsetConversion[charset].iconvName; }
+
+constexpr CharsetId kSingleByte[] = {
+    CHARSET_LATIN1,    CHARSET_KOI8R,      CHARSET_ISO8859_11, CHARSET_ISO8859_6, CHARSET_ISO8859_8,
+    CHARSET_ISO8859_2, CHARSET_ISO8859_15, CHARSET_CP1250,     CHARSET_CP1251,    CHARSET_CP1256};
+constexpr CharsetId kMultiByte[] = {CHARSET_EUCJP, CHARSET_SJIS, CHARSET_GB18030,   CHARSET_GB2312,
+                                    CHARSET_GBK,   CHARSET_BIG5, CHARSET_BIG5HKSCS, CHARSET_EUCKR};
+
+// Every code of up to four bytes worth trying: all double-byte lead/trail
+// pairs, EUC-JP's three-byte codes, and GB18030's four-byte codes under 0x81.
+std::vector<std::string> candidate_codes(CharsetId charset) {
+    std::vector<std::string> codes;
+    for (int lead = 0x81; lead <= 0xFE; ++lead)
+        for (int trail = 0x40; trail <= 0xFE; ++trail) codes.push_back({char(lead), char(trail)});
+    if (charset == CHARSET_EUCJP)
+        for (int a = 0xA1; a <= 0xFE; ++a)
+            for (int b = 0xA1; b <= 0xFE; ++b) codes.push_back({char(0x8F), char(a), char(b)});
+    if (charset == CHARSET_GB18030)
+        for (int a = 0x30; a <= 0x39; ++a)
+            for (int b = 0x81; b <= 0xFE; ++b)
+                for (int c = 0x30; c <= 0x39; ++c) codes.push_back({char(0x81), char(a), char(b), char(c)});
+    return codes;
+}
+
+// Walks text with FromCharsetToUnicode; each step must deliver the next unit
+// and move past exactly the character's bytes.
+void walk_characters(CharsetId charset, const std::string &text, const std::vector<size_t> &sizes,
+                     const std::u16string &units) {
+    const char *p = text.c_str();
+    for (size_t i = 0; i < units.size(); ++i) {
+        const char *before = p;
+        uint16_t unit = 0;
+        uint32_t length = 0;
+        ASSERT_EQ(FromCharsetToUnicode(charset, &p, &unit, &length), 1) << i;
+        ASSERT_EQ(unit, units[i]) << i << ": " << testsupport::hex(std::string(before, sizes[i]));
+        ASSERT_EQ(static_cast<size_t>(p - before), sizes[i]) << i;
+        ASSERT_EQ(length, 2u);
+    }
+}
+
+}  // namespace
+
+TEST(EngineOracle, EverySingleByteBothWays) {
+    for (CharsetId charset : kSingleByte) {
+        SCOPED_TRACE(name_of(charset));
+        Oracle decode("UTF-16LE", name_of(charset)), encode(name_of(charset), "UTF-16LE");
+        std::string all, valid;
+        std::u16string expected, validUnits;
+        for (int b = 1; b < 256; ++b) {
+            const std::string byte(1, static_cast<char>(b));
+            auto units = decode(byte);
+            all += byte;
+            expected += units ? as_units(*units) : u"\uFFFD";
+            if (units) {
+                valid += byte;
+                validUnits += as_units(*units);
+            }
+        }
+        // Undecodable bytes become U+FFFD, one each, in place.
+        Outcome run = to_unicode(charset, all);
+        ASSERT_EQ(run.result, 1);
+        EXPECT_EQ(run.units(), expected + u'\0');
+        EXPECT_EQ(run.length, 2 * (expected.size() + 1));
+        EXPECT_EQ(run.sourceMoved, all.size() + 1);
+        EXPECT_EQ(run.destinationMoved, run.length);
+        std::vector<size_t> ones(expected.size(), 1);
+        walk_characters(charset, all, ones, expected);
+
+        Outcome back = from_unicode(charset, validUnits);
+        ASSERT_EQ(back.result, 1);
+        EXPECT_EQ(back.output, *encode(as_bytes(validUnits)) + '\0');
+        for (char16_t u : validUnits) {
+            char out[4];
+            char *q = out;
+            ASSERT_EQ(FromUnicodeToCharset(charset, u, &q), 1);
+            EXPECT_EQ(std::string(out, q), *encode(as_bytes(std::u16string(1, u))));
+        }
+    }
+}
+
+TEST(EngineOracle, KOI8RCharacterFunctionsEveryByte) {
+    Oracle decode("UTF-16LE", "KOI8-R");
+    for (int b = 1; b < 256; ++b) {
+        const char byte[2] = {static_cast<char>(b), 0};
+        const char *p = byte;
+        uint16_t unit = 0;
+        ASSERT_EQ(FromKOI8RToUnicode(&p, &unit), 1);
+        EXPECT_EQ(unit, as_units(*decode(std::string(1, byte[0])))[0]) << b;
+        EXPECT_EQ(p, byte + 1);
+        char out[2] = {0, 0};
+        char *q = out;
+        ASSERT_EQ(FromUnicodeToKOI8R(unit, &q), 1);
+        EXPECT_EQ(q, out + 1);
+        EXPECT_EQ(static_cast<unsigned char>(out[0]), b);
+    }
+    char out[2] = {'x', 'x'};
+    char *q = out;
+    EXPECT_EQ(FromUnicodeToKOI8R(0x20AC, &q), 0);
+    EXPECT_EQ(q, out);
+    EXPECT_EQ(out[0], 'x');
+}
+
+TEST(EngineOracle, EveryMultiByteCodeBothWays) {
+    for (CharsetId charset : kMultiByte) {
+        SCOPED_TRACE(name_of(charset));
+        Oracle decode("UTF-16LE", name_of(charset)), encode(name_of(charset), "UTF-16LE");
+        std::string text, single;
+        std::vector<size_t> sizes;
+        std::u16string singleUnits;
+        for (const std::string &code : candidate_codes(charset)) {
+            auto units = decode(code);
+            if (!units) continue;
+            text += code;
+            // Codes that make exactly one BMP character also go through the
+            // single-character function.
+            if (units->size() == 2) {
+                single += code;
+                sizes.push_back(code.size());
+                singleUnits += as_units(*units);
+            }
+        }
+        ASSERT_GT(sizes.size(), 5000u);
+        const std::u16string expected = as_units(*decode(text));
+        Outcome run = to_unicode(charset, text);
+        ASSERT_EQ(run.result, 1);
+        EXPECT_EQ(run.units(), expected + u'\0');
+        walk_characters(charset, single, sizes, singleUnits);
+
+        Outcome back = from_unicode(charset, expected);
+        ASSERT_EQ(back.result, 1);
+        EXPECT_EQ(back.output, *encode(as_bytes(expected)) + '\0');
+    }
+}
+
+TEST(EngineOracle, RandomUtf8BothWaysAndByCharacter) {
+    Oracle decode("UTF-16LE", "UTF-8");
+    // A leading ASCII letter takes the converter's first-output mark, which
+    // would leave no room for a surrogate pair in the 4-byte buffer.
+    const std::string text = "x" + testsupport::random_utf8(7, 4000);
+    const std::u16string expected = as_units(*decode(text));
+    Outcome run = to_unicode(CHARSET_UTF8, text, 2 * (expected.size() + 1));
+    ASSERT_EQ(run.result, 1);
+    EXPECT_EQ(run.units(), expected + u'\0');
+    Outcome back = from_unicode(CHARSET_UTF8, expected);
+    EXPECT_EQ(back.output, text + '\0');
+
+    // One unit per character: a pair gives its high surrogate and the
+    // source moves past the whole character.
+    std::u16string firstUnits;
+    std::vector<size_t> sizes;
+    for (size_t i = 0; i < text.size();) {
+        const unsigned char lead = text[i];
+        const size_t n = lead < 0x80 ? 1 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
+        firstUnits += as_units(*decode(text.substr(i, n)))[0];
+        sizes.push_back(n);
+        i += n;
+    }
+    walk_characters(CHARSET_UTF8, text, sizes, firstUnits);
+}
+
+namespace {
+// Strict UTF-8: the code point of the sequence at p, or 0 bytes when none
+// starts there.
+size_t strict_utf8(const unsigned char *p, size_t n, char32_t &cp) {
+    const unsigned char b = p[0];
+    size_t len = b < 0x80                 ? 1
+                 : b >= 0xC2 && b <= 0xDF ? 2
+                 : b >= 0xE0 && b <= 0xEF ? 3
+                 : b >= 0xF0 && b <= 0xF4 ? 4
+                                          : 0;
+    if (len == 0 || len > n) return 0;
+    cp = len == 1 ? b : b & (0x7F >> len);
+    for (size_t i = 1; i < len; ++i) {
+        if ((p[i] & 0xC0) != 0x80) return 0;
+        cp = cp << 6 | (p[i] & 0x3F);
+    }
+    const char32_t least[] = {0, 0, 0x80, 0x800, 0x10000};
+    if (cp < least[len] || cp > 0x10FFFF || (cp >= 0xD800 && cp <= 0xDFFF)) return 0;
+    return len;
+}
+}  // namespace
+
+TEST(EngineOracle, BrokenUtf8GetsOneSubstitutePerRejectedByte) {
+    std::mt19937 rng(11);
+    const std::vector<std::string> pieces = {
+        "a",        "\xC3\xA9",     "\xE2\x82\xAC", "\xF0\x9F\x98\x80", "\x80",     "\xBF",
+        "\xC0\xAF", "\xE0\x80\xAF", "\xED\xA0\x80", "\xF4\x90\x80\x80", "\xE2\x82", "\xF0\x9F\x98",
+        "\xFE",     "\xFF",         "\xC3"};
+    for (int round = 0; round < 200; ++round) {
+        std::string text;
+        for (int i = 0; i < 30; ++i) text += pieces[rng() % pieces.size()];
+        std::u16string expected;
+        const auto *p = reinterpret_cast<const unsigned char *>(text.data());
+        for (size_t i = 0; i < text.size();) {
+            char32_t cp = 0;
+            const size_t len = strict_utf8(p + i, text.size() - i, cp);
+            if (len == 0) cp = 0xFFFD;
+            if (cp >= 0x10000)
+                expected += {char16_t(0xD7C0 + (cp >> 10)), char16_t(0xDC00 | (cp & 0x3FF))};
+            else
+                expected += char16_t(cp);
+            i += len ? len : 1;
+        }
+        Outcome run = to_unicode(CHARSET_UTF8, text);
+        ASSERT_EQ(run.result, 1);
+        ASSERT_EQ(run.units(), expected + u'\0') << testsupport::hex(text);
+        EXPECT_EQ(run.sourceMoved, text.size() + 1);
+    }
+}
+
+TEST(EngineOracle, UnitsACharsetLacksBecomeQuestionMarks) {
+    std::mt19937 rng(5);
+    const std::vector<std::pair<char16_t, char16_t>> ranges = {
+        {0x20, 0x7E},     {0xA0, 0xC9},     {0x400, 0x45F},   {0x5D0, 0x5EA},
+        {0x620, 0x64A},   {0xE01, 0xE5B},   {0x3041, 0x30FF}, {0x4E00, 0x9FA5},
+        {0xAC00, 0xD7A3}, {0x20AC, 0x20AC}, {0xD800, 0xDBFF}, {0xDC00, 0xDFFF}};
+    for (CharsetId charset = CHARSET_LATIN1; charset < CHARSET_COUNT; ++charset) {
+        // UTF-16 as a target marks only its first output; its two byte
+        // orders are not known to glibc by the registry's names.
+        if (charset == CHARSET_UTF16 || charset == CHARSET_UTF16LE || charset == CHARSET_UTF16BE) continue;
+        SCOPED_TRACE(name_of(charset));
+        Oracle encode(name_of(charset), "UTF-16LE");
+        std::u16string text;
+        std::string expected;
+        for (int i = 0; i < 400; ++i) {
+            const auto &[lo, hi] = ranges[rng() % ranges.size()];
+            std::u16string ch(1, char16_t(lo + rng() % (hi - lo + 1)));
+            // A high surrogate is followed by a low one half of the time.
+            if (ch[0] >= 0xD800 && ch[0] < 0xDC00 && rng() % 2) ch += char16_t(0xDC00 + rng() % 0x400);
+            // A lone low surrogate must not pair with a lone high one before it.
+            if (ch[0] >= 0xDC00 && ch[0] < 0xE000 && !text.empty() && text.back() >= 0xD800 &&
+                text.back() < 0xDC00)
+                continue;
+            text += ch;
+            auto bytes = encode(as_bytes(ch));
+            expected += bytes ? *bytes : std::string(ch.size(), '?');
+        }
+        Outcome run = from_unicode(charset, text);
+        ASSERT_EQ(run.result, 1);
+        EXPECT_EQ(run.output, expected + '\0');
+        EXPECT_EQ(run.sourceMoved, 2 * (text.size() + 1));
+        EXPECT_EQ(run.destinationMoved, run.length);
+    }
+}
+
+TEST(EngineOracle, SixteenBitSourceStaysInStepAfterARejectedUnit) {
+    const std::u16string text =
+        u"A\xDC00"
+        u"B\xD800"
+        u"C";
+    Outcome run = to_unicode(CHARSET_UTF16, as_bytes(text));
+    ASSERT_EQ(run.result, 1);
+    EXPECT_EQ(run.units(), std::u16string(u"A\xFFFD"
+                                          u"B\xFFFD"
+                                          u"C") +
+                               u'\0');
+    EXPECT_EQ(run.sourceMoved, 12u);
+
+    const std::string lone = as_bytes(
+        u"\xDC00"
+        u"D");
+    const char *p = lone.c_str();
+    uint16_t unit = 0;
+    uint32_t length = 0;
+    ASSERT_EQ(FromCharsetToUnicode(CHARSET_UTF16, &p, &unit, &length), 1);
+    EXPECT_EQ(unit, 0xFFFD);
+    EXPECT_EQ(p, lone.c_str() + 2);
+}
+
+TEST(EngineOracle, CharacterDecoderThatTakesAMarkDeliversTheNextCharacter) {
+    // Leave U+005A in the shared single-character buffer first.
+    const char *z = "Z";
+    uint16_t unit = 0;
+    uint32_t length = 0;
+    ASSERT_EQ(FromCharsetToUnicode(CHARSET_LATIN1, &z, &unit, &length), 1);
+    // glibc's "UTF-16" decoder takes FF FE as a mark: success, no unit.
+    const char marked[] = {'\xFF', '\xFE', 'A', '\0', '\0', '\0'};
+    const char *p = marked;
+    ASSERT_EQ(FromCharsetToUnicode(CHARSET_UTF16, &p, &unit, &length), 1);
+    EXPECT_EQ(unit, u'A');
+    EXPECT_EQ(p, marked + 4);
+}
+
+TEST(EngineOracle, RoomIsNeverExceeded) {
+    // To UTF-16 (the first call meets glibc's mark), and from UTF-16, with
+    // substitutes in the text: every room below the need fails, nothing is
+    // written past the room, and the reported part lies inside it.
+    const std::string bytes =
+        "A\xFF\xC3\xA9\xE2\x82\xAC\xFE"
+        "B";
+    const std::u16string text =
+        u"A\x20AC\xD800\xE9"
+        u"B\xD83D\xDE00";
+    const uint32_t needUnicode = 2 * (6 + 1), needLatin1 = 7 + 1;
+    for (uint32_t room = 0; room <= needUnicode + 2; ++room) {
+        SCOPED_TRACE(room);
+        Outcome u = to_unicode(CHARSET_UTF8, bytes, room);
+        EXPECT_EQ(u.result, room >= needUnicode ? 1 : 0);
+        EXPECT_TRUE(u.guardIntact);
+        if (u.result) {
+            EXPECT_EQ(u.units(), std::u16string(u"A\xFFFD\xE9\x20AC\xFFFD"
+                                                u"B") +
+                                     u'\0');
+        } else {
+            EXPECT_LE(u.destinationMoved + u.length, room);
+        }
+
+        Outcome c = from_unicode(CHARSET_LATIN1, text, room);
+        EXPECT_EQ(c.result, room >= needLatin1 ? 1 : 0);
+        EXPECT_TRUE(c.guardIntact);
+        if (c.result) {
+            EXPECT_EQ(c.output, std::string("A??\xE9"
+                                            "B??") +
+                                    '\0');
+        } else {
+            EXPECT_LE(c.destinationMoved + c.length, room);
+        }
+    }
+}
+
+TEST(EngineOracle, RealTextBothWays) {
+    const std::pair<const char *, CharsetId> kinds[] = {{".utf8.txt", CHARSET_UTF8},
+                                                        {".sjis.txt", CHARSET_SJIS},
+                                                        {".eucjp.txt", CHARSET_EUCJP},
+                                                        {".koi8r.txt", CHARSET_KOI8R},
+                                                        {".latin1.txt", CHARSET_LATIN1}};
+    size_t files = 0;
+    for (const auto &[suffix, charset] : kinds) {
+        Oracle decode("UTF-16LE", name_of(charset)), encode(name_of(charset), "UTF-16LE");
+        for (const std::string &file : testsupport::corpus_files(suffix)) {
+            SCOPED_TRACE(file);
+            const std::string text = *testsupport::read_corpus(file);
+            const std::u16string expected = as_units(*decode(text));
+            // Exactly the room the text and its terminator need.
+            Outcome run = to_unicode(charset, text, 2 * (expected.size() + 1));
+            ASSERT_EQ(run.result, 1);
+            EXPECT_TRUE(run.units() == expected + u'\0');
+            const std::string encoded = *encode(as_bytes(expected));
+            Outcome back = from_unicode(charset, expected, encoded.size() + 1);
+            ASSERT_EQ(back.result, 1);
+            EXPECT_TRUE(back.output == encoded + '\0');
+            ++files;
+        }
+    }
+    if (files == 0) GTEST_SKIP() << "no corpora";
+}

@@ -1,0 +1,113 @@
+// Server code pages: each known page against glibc iconv, the bounded copy
+// of text that is not converted, and the scratch buffer always given back.
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+
+#include "engine_checks.h"
+#include "platform_shim.h"
+
+using namespace enginetest;
+
+namespace {
+
+struct Result {
+    std::string bytes;  // the room's bytes
+    uint32_t length;
+    bool guardIntact;
+};
+
+Result from_server(CharsetId charset, int32_t codePage, const std::string &source, uint32_t room) {
+    std::vector<char> buffer(room + kGuard, static_cast<char>(kGuardByte));
+    uint32_t length = room;
+    EXPECT_EQ(StringFromServerCPToCharset(charset, codePage, source.c_str(), buffer.data(), &length), 1);
+    return {std::string(buffer.data(), room), length, guard_intact(buffer, room)};
+}
+
+}  // namespace
+
+TEST(EngineServerCP, EveryKnownCodePageAgainstIconv) {
+    const std::pair<int32_t, const char *> pages[] = {
+        {874, "ISO-8859-11"}, {932, "SJIS"},    {936, "GBK"},         {949, "EUC-KR"},      {950, "BIG5"},
+        {1250, "CP1250"},     {1251, "CP1251"}, {1252, "ISO-8859-1"}, {1255, "ISO-8859-8"}, {1256, "CP1256"}};
+    for (const auto &[page, name] : pages) {
+        SCOPED_TRACE(page);
+        Oracle decode("UTF-8", name);
+        // Every byte the charset decodes alone, then double-byte codes.
+        std::string source;
+        for (int b = 1; b < 256; ++b)
+            if (decode(std::string(1, static_cast<char>(b)))) source += static_cast<char>(b);
+        for (int lead = 0x81; lead <= 0xFE; lead += 5)
+            for (int trail = 0x40; trail <= 0xFE; ++trail) {
+                const std::string code = {static_cast<char>(lead), static_cast<char>(trail)};
+                if (decode(code) && decode(code)->size() > 1 && !decode(code.substr(0, 1))) source += code;
+            }
+        const std::string expected = *decode(source);
+        const int mallocs = shim::mallocs;
+        Result r = from_server(CHARSET_UTF8, page, source, static_cast<uint32_t>(expected.size() + 1));
+        EXPECT_TRUE(r.bytes == expected + '\0');
+        EXPECT_EQ(r.length, expected.size() + 1);
+        EXPECT_EQ(shim::mallocs, mallocs + 1);
+        EXPECT_EQ(shim::frees, shim::mallocs);
+    }
+    // 1252 is read as ISO-8859-1: 0x80 is U+0080, not the euro sign.
+    EXPECT_EQ(from_server(CHARSET_UTF8, 1252, "\x41\xE9", 4).bytes, std::string("\x41\xC3\xA9\0", 4));
+    EXPECT_EQ(from_server(CHARSET_UTF8, 1252, "\x80", 3).bytes, std::string("\xC2\x80\0", 3));
+}
+
+TEST(EngineServerCP, UnknownCodePagesAreCopiedAndCut) {
+    for (int32_t page : {1253, 0, -1, 65001}) {
+        Result cut = from_server(CHARSET_UTF8, page, "abcdef", 4);
+        EXPECT_EQ(cut.bytes, std::string("abc\0", 4));
+        EXPECT_EQ(cut.length, 4u);
+        Result padded = from_server(CHARSET_UTF8, page, "ab", 8);
+        EXPECT_EQ(padded.bytes, std::string("ab\0\0\0\0\0\0", 8));
+        EXPECT_EQ(padded.length, 3u);
+    }
+    // No room at all: nothing is written.
+    Result none = from_server(CHARSET_UTF8, 1253, "ab", 0);
+    EXPECT_TRUE(none.guardIntact);
+    EXPECT_EQ(none.length, 0u);
+    EXPECT_EQ(shim::mallocs, 0);
+}
+
+TEST(EngineServerCP, TextNotConvertedIsCopiedFromItsStart) {
+    const std::string cyrillic = "\xCF\xF0\xE8\xE2\xE5\xF2 world";  // CP1251
+    testing::internal::CaptureStderr();
+    // No memory.
+    shim::mallocFails = true;
+    Result noMemory = from_server(CHARSET_UTF8, 1251, cyrillic, 32);
+    EXPECT_EQ(noMemory.bytes.c_str(), cyrillic);
+    EXPECT_EQ(noMemory.length, cyrillic.size() + 1);
+    shim::mallocFails = false;
+    // No converter to the target.
+    Result noTarget = from_server(CHARSET_UTF16LE, 1251, cyrillic, 32);
+    EXPECT_EQ(noTarget.bytes.c_str(), cyrillic);
+    EXPECT_EQ(noTarget.length, cyrillic.size() + 1);
+    // The converted text does not fit (19 bytes): the source, cut if need be.
+    Result small = from_server(CHARSET_UTF8, 1251, cyrillic, 16);
+    EXPECT_EQ(small.bytes.c_str(), cyrillic);
+    EXPECT_EQ(small.length, cyrillic.size() + 1);
+    Result cut = from_server(CHARSET_UTF8, 1251, cyrillic, 8);
+    EXPECT_EQ(cut.bytes.c_str(), cyrillic.substr(0, 7));
+    EXPECT_EQ(cut.length, 8u);
+    EXPECT_TRUE(cut.guardIntact);
+    // No converter from the code page's charset.
+    shim::missingNames = {"SJIS"};
+    Result noSource = from_server(CHARSET_UTF8, 932, "\x82\xA0 A", 16);
+    EXPECT_EQ(noSource.bytes.c_str(), std::string("\x82\xA0 A"));
+    EXPECT_EQ(testing::internal::GetCapturedStderr(),
+              "Cannot use iconv to convert from UTF-16 to UTF16-LE (1055)\n"
+              "Cannot use iconv to convert from SJIS (130) to UTF-16\n");
+    EXPECT_EQ(shim::prompts, (std::vector<std::string>{"UTF-16->UTF16-LE", "SJIS->UTF-16"}));
+    EXPECT_EQ(shim::frees, shim::mallocs);
+    EXPECT_EQ(shim::mallocs, 4);
+}
+
+TEST(EngineServerCP, ToTheLocalEncoding) {
+    setenv("LC_ALL", "C.UTF-8", 1);
+    char out[8];
+    uint32_t length = sizeof out;
+    EXPECT_EQ(StringFromServerCPToLocal(1251, "\xC0\xE1", out, &length), 1);
+    EXPECT_EQ(std::string(out, length), std::string("\xD0\x90\xD0\xB1\0", 5));
+}
