@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 #include <langinfo.h>
 
+#include <cctype>
 #include <clocale>
 #include <cstdlib>
 #include <string>
