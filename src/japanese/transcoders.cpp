@@ -42,36 +42,29 @@ uint32_t eucjp_to_utf8(const uint8_t *euc, char *utf8, uint8_t *count) {
     }
     uint16_t unit;
     uint32_t taken;
-    // A lead byte cut short by the terminator cannot start a character;
-    // nothing after the terminator is read.
+    // A character cut short, by the terminator or by an ASCII byte, cannot
+    // start here: nothing after the terminator is read, no ASCII byte is
+    // taken into a bad sequence, and no more than three UTF-8 bytes are
+    // written for every two EUC-JP bytes, as callers size their buffers.
     if (is_euc_byte(b0)) {
-        if (euc[1] == 0) return 0;
+        if (euc[1] < 0x80) return 0;
         const uint8_t code[2] = {static_cast<uint8_t>(b0 + 0x60), static_cast<uint8_t>(euc[1] + 0x60)};
         jis_to_unicode(code, &unit, JIS_FORM_X0208);
         taken = 2;
     } else if (b0 == 0x8E) {
-        if (euc[1] == 0) return 0;
+        if (euc[1] < 0x80) return 0;
         const uint8_t position = static_cast<uint8_t>(euc[1] + 0x60);
         jis_to_unicode(&position, &unit, JIS_FORM_KATAKANA);
         taken = 2;
     } else if (b0 == 0x8F) {
-        if (euc[1] == 0 || euc[2] == 0) return 0;
+        if (euc[1] < 0x80 || euc[2] < 0x80) return 0;
         const uint8_t code[2] = {static_cast<uint8_t>(euc[1] + 0x60), static_cast<uint8_t>(euc[2] + 0x60)};
         jis_to_unicode(code, &unit, JIS_FORM_X0212);
         taken = 3;
     } else {
         return 0;
     }
-    // A failed conversion leaves kNoCharacter in the unit, which is written
-    // as U+FFFF. An ASCII byte inside the sequence is no part of it: the
-    // character ends before it, so that byte is read again on its own.
-    for (uint32_t i = 1; i < taken; ++i) {
-        if (euc[i] < 0x80) {
-            unit = kNoCharacter;
-            taken = i;
-            break;
-        }
-    }
+    // A failed conversion leaves kNoCharacter in the unit: U+FFFF.
     FromUCS4toUTF8(unit, utf8, count);
     return taken;
 }
