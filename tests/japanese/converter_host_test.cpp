@@ -1,0 +1,137 @@
+// The EUC-JP converters as the host sees them: the prompt when the platform
+// lacks one, silence on stderr, how often iconv runs, and the Mem_alloc
+// buffer of StringToCurrentEncoding. The test supplies the host services and
+// stands between the library and glibc's iconv_open and iconv.
+#include <dlfcn.h>
+#include <gtest/gtest.h>
+#include <iconv.h>
+
+#include <cstdlib>
+#include <cstring>
+#include <string>
+#include <vector>
+
+#include "textconv.h"
+
+namespace {
+bool eucjpMissing = false;
+bool memoryExhausted = false;
+int promptAnswer = 1;
+int iconvCalls = 0, memAllocs = 0, memFrees = 0;
+std::vector<std::string> prompts;
+}  // namespace
+
+extern "C" {
+iconv_t iconv_open(const char *to, const char *from) {
+    if (eucjpMissing && (!std::strcmp(to, "EUC-JP") || !std::strcmp(from, "EUC-JP")))
+        return reinterpret_cast<iconv_t>(-1);
+    static auto real =
+        reinterpret_cast<iconv_t (*)(const char *, const char *)>(dlsym(RTLD_NEXT, "iconv_open"));
+    return real(to, from);
+}
+size_t iconv(iconv_t cd, char **in, size_t *inLeft, char **out, size_t *outLeft) {
+    ++iconvCalls;
+    static auto real = reinterpret_cast<size_t (*)(iconv_t, char **, size_t *, char **, size_t *)>(
+        dlsym(RTLD_NEXT, "iconv"));
+    return real(cd, in, inLeft, out, outLeft);
+}
+int UIYesNoDisplay(uint32_t question, uint32_t a, uint32_t b, const char *from, const char *to) {
+    prompts.push_back(std::to_string(question) + std::to_string(a) + std::to_string(b) + " " + from + "->" +
+                      to);
+    return promptAnswer;
+}
+void *HostMalloc(uint32_t size, uint32_t) { return std::malloc(size); }
+void HostFree(void *p) { std::free(p); }
+int Mem_alloc(uint32_t pool, uint32_t size, void **block) {
+    if (memoryExhausted || pool != 1) return 1;
+    ++memAllocs;
+    return (*block = std::malloc(size)) ? 0 : 1;
+}
+void Mem_free(uint32_t pool, void *block) {
+    memFrees += pool == 1;
+    std::free(block);
+}
+int32_t GetiStringID(const char *key, const StringIDEntry *table) {
+    for (; table->name; ++table)
+        if (!std::strcmp(key, table->name)) break;
+    return table->id;
+}
+void *memmove_soc(void *d, const void *s, uint32_t n) { return std::memmove(d, s, n); }
+}
+
+// The user accepts to go on without EUC-JP: asked once, then every
+// non-ASCII character fails quietly, row 13 included (the table is consulted
+// only once the converter is open).
+TEST(EucJpConverterMissing, AcceptedFailsQuietly) {
+    eucjpMissing = true;
+    testing::internal::CaptureStderr();
+    const uint8_t row13[2] = {13, 1};
+    uint16_t unit = 0;
+    EXPECT_EQ(ConvertFromJISToUnicode(row13, &unit, JIS_FORM_X0208), 0);
+    EXPECT_EQ(unit, 0xFFFF);
+    EXPECT_EQ(prompts, std::vector<std::string>{"300 EUC-JP->UTF-16"});
+    char utf8[4];
+    uint8_t count = 0;
+    EXPECT_EQ(FromEUCJPtoUTF8("\xA4\xA2", utf8, &count), 2u);
+    EXPECT_EQ(std::string(utf8, count), "\xEF\xBF\xBF");
+    char sjis[8];
+    int32_t length = 7;
+    EXPECT_EQ(StringFromEUCJPToSJIS("A\xA4\xA2"
+                                    "B",
+                                    sjis, &length),
+              0);
+    EXPECT_STREQ(sjis, "A B");
+    EXPECT_EQ(ConvertFromUnicodeToEUCJP(0x2460, sjis), 0);  // the table is not tried either
+    EXPECT_EQ(prompts, (std::vector<std::string>{"300 EUC-JP->UTF-16", "300 UTF-16->EUC-JP"}));
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
+}
+
+TEST(EucJpConverterMissing, DeclinedEndsTheProcess) {
+    eucjpMissing = true;
+    promptAnswer = 0;
+    const uint8_t hiragana[2] = {4, 2};
+    uint16_t unit;
+    EXPECT_EXIT(ConvertFromJISToUnicode(hiragana, &unit, JIS_FORM_X0208), testing::ExitedWithCode(1), "");
+    EXPECT_EXIT(ConvertFromUnicodeToEUCJP(0x3042, reinterpret_cast<char *>(&unit)),
+                testing::ExitedWithCode(1), "");
+}
+
+// At most one iconv call per character, plus the throwaway of the first use;
+// a character seen before, and row 13, need none.
+TEST(EucJpConverter, IconvCallsPerCharacter) {
+    const uint8_t hiragana[2] = {4, 2}, other[2] = {4, 4}, row13[2] = {13, 1};
+    uint16_t unit;
+    ConvertFromJISToUnicode(hiragana, &unit, JIS_FORM_X0208);
+    EXPECT_EQ(iconvCalls, 2);
+    ConvertFromJISToUnicode(hiragana, &unit, JIS_FORM_X0208);
+    ConvertFromJISToUnicode(row13, &unit, JIS_FORM_X0208);
+    EXPECT_EQ(iconvCalls, 2);
+    ConvertFromJISToUnicode(other, &unit, JIS_FORM_X0208);
+    EXPECT_EQ(unit, 0x3044);
+    EXPECT_EQ(iconvCalls, 3);
+    char sjis[16];
+    int32_t length = 15;
+    EXPECT_EQ(StringFromEUCJPToSJIS("\xA4\xA2\xA4\xA2\xA4\xA2\xAD\xA1", sjis, &length), 1);
+    EXPECT_STREQ(sjis, "\x82\xA0\x82\xA0\x82\xA0\x87\x40");
+    EXPECT_EQ(iconvCalls, 3 + 2);  // one encoding each for the hiragana and the circled digit
+    EXPECT_TRUE(prompts.empty());
+}
+
+// A real ja_JP EUC-JP locale through LOCPATH.
+TEST(StringToCurrentEncodingBuffer, ReleasedOrHandedOver) {
+    setenv("LC_ALL", "ja_JP.eucJP", 1);
+    char *result = nullptr;
+    const char *bad = "\x82\xA0\t";
+    EXPECT_EQ(StringToCurrentEncoding(bad, &result), 0);
+    EXPECT_EQ(result, bad);
+    EXPECT_EQ(memAllocs, 1);
+    EXPECT_EQ(memFrees, 1);
+    memoryExhausted = true;
+    EXPECT_EQ(StringToCurrentEncoding("\x82\xA0", &result), 0);
+    EXPECT_STREQ(result, "\x82\xA0");
+    memoryExhausted = false;
+    EXPECT_EQ(StringToCurrentEncoding("\x82\xA0", &result), 1);
+    EXPECT_STREQ(result, "\xA4\xA2");
+    Mem_free(1, result);
+    EXPECT_EQ(memAllocs, memFrees);
+}
