@@ -1,0 +1,65 @@
+// glibc iconv as the oracle for the local charset, with text from the corpora.
+#pragma once
+
+#include <iconv.h>
+
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "test_support.h"
+
+namespace localtest {
+
+// One unit at a time to a charset through one open glibc descriptor; the
+// answers are kept, so exhaustive sweeps stay cheap.
+class UnitOracle {
+  public:
+    explicit UnitOracle(const char *charset) : cd_(iconv_open(charset, "UTF-16LE")) {}
+    ~UnitOracle() {
+        if (cd_ != reinterpret_cast<iconv_t>(-1)) iconv_close(cd_);
+    }
+    bool ok() const { return cd_ != reinterpret_cast<iconv_t>(-1); }
+    // The bytes of one unit, or nullopt when the charset has no such character.
+    std::optional<std::string> bytes(char16_t unit) {
+        auto it = cache_.find(unit);
+        if (it != cache_.end()) return it->second;
+        char in[2] = {static_cast<char>(unit & 0xFF), static_cast<char>(unit >> 8)};
+        char out[16];
+        char *ip = in, *op = out;
+        size_t il = 2, ol = sizeof out;
+        iconv(cd_, nullptr, nullptr, nullptr, nullptr);
+        std::optional<std::string> r;
+        if (iconv(cd_, &ip, &il, &op, &ol) != static_cast<size_t>(-1) && il == 0)
+            r = std::string(out, sizeof out - ol);
+        cache_.emplace(unit, r);
+        return r;
+    }
+
+  private:
+    iconv_t cd_;
+    std::map<char16_t, std::optional<std::string>> cache_;
+};
+
+// Lines of every UTF-8 corpus (at most perFile of each, no empty ones).
+inline std::vector<std::string> utf8_lines(size_t perFile) {
+    std::vector<std::string> lines;
+    for (const std::string &name : testsupport::corpus_files(".utf8.txt")) {
+        auto text = testsupport::read_corpus(name);
+        if (!text) continue;
+        size_t start = 0, taken = 0;
+        while (start < text->size() && taken < perFile) {
+            size_t end = text->find('\n', start);
+            if (end == std::string::npos) end = text->size();
+            if (end > start) {
+                lines.push_back(text->substr(start, end - start));
+                ++taken;
+            }
+            start = end + 1;
+        }
+    }
+    return lines;
+}
+
+}  // namespace localtest
