@@ -65,6 +65,20 @@ inline __m128i bytes_in_range(__m128i b, uint8_t lo, uint8_t hi) {
     return _mm_cmpeq_epi8(_mm_min_epu8(x, _mm_set1_epi8(static_cast<char>(hi - lo))), x);
 }
 
+// The unit each of 16 positions would start, from the bytes at the position
+// and the two after it (b0, b1, b2) and the 2- and 3-byte lead masks.
+TEXTCONV_AVX2 inline __m256i utf8_units(__m128i b0, __m128i b1, __m128i b2, __m128i l2, __m128i l3) {
+    const __m256i w0 = _mm256_cvtepu8_epi16(b0);
+    const __m256i t1 = _mm256_and_si256(_mm256_cvtepu8_epi16(b1), _mm256_set1_epi16(0x3F));
+    const __m256i t2 = _mm256_and_si256(_mm256_cvtepu8_epi16(b2), _mm256_set1_epi16(0x3F));
+    const __m256i v2 =
+        _mm256_or_si256(_mm256_and_si256(_mm256_slli_epi16(w0, 6), _mm256_set1_epi16(0x7C0)), t1);
+    const __m256i v3 =
+        _mm256_or_si256(_mm256_or_si256(_mm256_slli_epi16(w0, 12), _mm256_slli_epi16(t1, 6)), t2);
+    const __m256i u = _mm256_blendv_epi8(w0, v2, _mm256_cvtepi8_epi16(l2));
+    return _mm256_blendv_epi8(u, v3, _mm256_cvtepi8_epi16(l3));
+}
+
 // Sixteen positions of UTF-8 at s (18 bytes readable) holding only ASCII and
 // well-formed 2- and 3-byte sequences, the last one possibly running up to 2
 // bytes past the 16. On success writes the units at d (48 bytes writable) and
@@ -95,16 +109,7 @@ TEXTCONV_AVX2 inline bool utf8_block(const uint8_t *s, uint16_t *d, uint32_t &co
     const uint32_t expected = (lead2 << 1) | (lead3 << 1) | (lead3 << 2);
     if ((contAll & ((1u << end) - 1)) != expected) return false;
 
-    // One candidate unit per position, 16 lanes of 16 bits.
-    const __m256i w0 = _mm256_cvtepu8_epi16(b0);
-    const __m256i t1 = _mm256_and_si256(_mm256_cvtepu8_epi16(b1), _mm256_set1_epi16(0x3F));
-    const __m256i t2 = _mm256_and_si256(_mm256_cvtepu8_epi16(b2), _mm256_set1_epi16(0x3F));
-    const __m256i v2 =
-        _mm256_or_si256(_mm256_and_si256(_mm256_slli_epi16(w0, 6), _mm256_set1_epi16(0x7C0)), t1);
-    const __m256i v3 =
-        _mm256_or_si256(_mm256_or_si256(_mm256_slli_epi16(w0, 12), _mm256_slli_epi16(t1, 6)), t2);
-    __m256i u = _mm256_blendv_epi8(w0, v2, _mm256_cvtepi8_epi16(l2));
-    u = _mm256_blendv_epi8(u, v3, _mm256_cvtepi8_epi16(l3));
+    const __m256i u = utf8_units(b0, b1, b2, l2, l3);
     // Drop the continuation positions, eight lanes per half.
     const uint32_t keep = ~cont & 0xFFFF;
     const __m256i packed =
@@ -117,6 +122,63 @@ TEXTCONV_AVX2 inline bool utf8_block(const uint8_t *s, uint16_t *d, uint32_t &co
     store16(d + k0 + k1, old);
     consumed = end;
     units = k0 + k1;
+    return true;
+}
+
+TEXTCONV_AVX2 inline __m256i bytes_in_range(__m256i b, uint8_t lo, uint8_t hi) {
+    const __m256i x = _mm256_sub_epi8(b, _mm256_set1_epi8(static_cast<char>(lo)));
+    return _mm256_cmpeq_epi8(_mm256_min_epu8(x, _mm256_set1_epi8(static_cast<char>(hi - lo))), x);
+}
+
+// The same over 32 positions (34 bytes readable, 80 bytes writable at d).
+TEXTCONV_AVX2 inline bool utf8_block32(const uint8_t *s, uint16_t *d, uint32_t &consumed, uint32_t &units) {
+    const __m256i b0 = load32(s), b1 = load32(s + 1), b2 = load32(s + 2);
+    const __m256i tagMask = _mm256_set1_epi8(static_cast<char>(0xC0)),
+                  tag = _mm256_set1_epi8(static_cast<char>(0x80));
+    const uint32_t nonAscii = static_cast<uint32_t>(_mm256_movemask_epi8(b0));
+    const uint32_t cont =
+        static_cast<uint32_t>(_mm256_movemask_epi8(_mm256_cmpeq_epi8(_mm256_and_si256(b0, tagMask), tag)));
+    const uint32_t cont2 =
+        static_cast<uint32_t>(_mm256_movemask_epi8(_mm256_cmpeq_epi8(_mm256_and_si256(b2, tagMask), tag)));
+    const __m256i l2 = bytes_in_range(b0, 0xC2, 0xDF), l3 = bytes_in_range(b0, 0xE0, 0xEF);
+    const uint32_t lead2 = static_cast<uint32_t>(_mm256_movemask_epi8(l2));
+    const uint32_t lead3 = static_cast<uint32_t>(_mm256_movemask_epi8(l3));
+    if ((cont | lead2 | lead3) != nonAscii) return false;
+    const __m256i second80to9F =
+        _mm256_cmpeq_epi8(_mm256_and_si256(b1, _mm256_set1_epi8(0x20)), _mm256_setzero_si256());
+    const __m256i bad = _mm256_or_si256(
+        _mm256_and_si256(_mm256_cmpeq_epi8(b0, _mm256_set1_epi8(static_cast<char>(0xE0))), second80to9F),
+        _mm256_andnot_si256(second80to9F, _mm256_cmpeq_epi8(b0, _mm256_set1_epi8(static_cast<char>(0xED)))));
+    if (_mm256_movemask_epi8(bad) != 0) return false;
+    const uint32_t end = 32 + ((lead2 >> 31) | ((lead3 >> 30) & 1) | ((lead3 >> 31) << 1));
+    const uint64_t contAll = cont | (static_cast<uint64_t>(cont2 >> 30) << 32);
+    const uint64_t expected =
+        (static_cast<uint64_t>(lead2 | lead3) << 1) | (static_cast<uint64_t>(lead3) << 2);
+    if ((contAll & ((uint64_t{1} << end) - 1)) != expected) return false;
+
+    const __m256i u0 =
+        utf8_units(_mm256_castsi256_si128(b0), _mm256_castsi256_si128(b1), _mm256_castsi256_si128(b2),
+                   _mm256_castsi256_si128(l2), _mm256_castsi256_si128(l3));
+    const __m256i u1 = utf8_units(_mm256_extracti128_si256(b0, 1), _mm256_extracti128_si256(b1, 1),
+                                  _mm256_extracti128_si256(b2, 1), _mm256_extracti128_si256(l2, 1),
+                                  _mm256_extracti128_si256(l3, 1));
+    const uint32_t keep = ~cont;
+    const __m256i p0 =
+        _mm256_shuffle_epi8(u0, two_shuffles(kKeepLanes[keep & 0xFF], kKeepLanes[(keep >> 8) & 0xFF]));
+    const __m256i p1 =
+        _mm256_shuffle_epi8(u1, two_shuffles(kKeepLanes[(keep >> 16) & 0xFF], kKeepLanes[keep >> 24]));
+    const uint32_t k0 = static_cast<uint32_t>(_mm_popcnt_u32(keep & 0xFF));
+    const uint32_t k1 = k0 + static_cast<uint32_t>(_mm_popcnt_u32(keep & 0xFF00));
+    const uint32_t k2 = k1 + static_cast<uint32_t>(_mm_popcnt_u32(keep & 0xFF0000));
+    const uint32_t k3 = k2 + static_cast<uint32_t>(_mm_popcnt_u32(keep & 0xFF000000));
+    const __m128i old = load16(d + k3);
+    store16(d, _mm256_castsi256_si128(p0));
+    store16(d + k0, _mm256_extracti128_si256(p0, 1));
+    store16(d + k1, _mm256_castsi256_si128(p1));
+    store16(d + k2, _mm256_extracti128_si256(p1, 1));
+    store16(d + k3, old);
+    consumed = end;
+    units = k3;
     return true;
 }
 
@@ -152,6 +214,30 @@ TEXTCONV_AVX2 inline uint32_t utf16_block(const uint16_t *s, uint8_t *d) {
     store16(d + s0.length, _mm_shuffle_epi8(g1, load16(s1.index)));
     store16(d + s0.length + s1.length, old);
     return static_cast<uint32_t>(s0.length + s1.length);
+}
+
+// Sixteen units below U+0800 (one or two bytes each) to UTF-8 at d (48
+// bytes writable); returns the bytes written.
+TEXTCONV_AVX2 inline uint32_t utf16_block_two_bytes(__m256i u, uint8_t *d) {
+    const __m256i below80 = _mm256_cmpeq_epi16(
+        _mm256_and_si256(u, _mm256_set1_epi16(static_cast<short>(0xFF80))), _mm256_setzero_si256());
+    const uint32_t m = ~static_cast<uint32_t>(_mm_movemask_epi8(_mm_packs_epi16(
+                           _mm256_castsi256_si128(below80), _mm256_extracti128_si256(below80, 1)))) &
+                       0xFFFF;
+    const __m256i first =
+        _mm256_blendv_epi8(_mm256_or_si256(_mm256_srli_epi16(u, 6), _mm256_set1_epi16(0xC0)), u, below80);
+    const __m256i second =
+        _mm256_or_si256(_mm256_and_si256(u, _mm256_set1_epi16(0x3F)), _mm256_set1_epi16(0x80));
+    const __m256i pairs = _mm256_or_si256(first, _mm256_slli_epi16(second, 8));
+    const __m256i out =
+        _mm256_shuffle_epi8(pairs, two_shuffles(kLatin1Pairs[m & 0xFF], kLatin1Pairs[m >> 8]));
+    const uint32_t l0 = 8 + static_cast<uint32_t>(_mm_popcnt_u32(m & 0xFF));
+    const uint32_t l1 = 8 + static_cast<uint32_t>(_mm_popcnt_u32(m >> 8));
+    const __m128i old = load16(d + l0 + l1);
+    store16(d, _mm256_castsi256_si128(out));
+    store16(d + l0, _mm256_extracti128_si256(out, 1));
+    store16(d + l0 + l1, old);
+    return l0 + l1;
 }
 
 // Sixteen Latin-1 bytes with at least one above 0x7F (mask m) to UTF-8 at d
@@ -260,8 +346,13 @@ TEXTCONV_AVX2 uint32_t utf8_to_utf16_avx2(const uint8_t *s, uint32_t len, uint16
                 continue;
             }
         }
+        uint32_t consumed, units;
+        if (len - p >= 34 && cap - w >= 80 && utf8_block32(s + p, d + w / 2, consumed, units)) {
+            p += consumed;
+            w += 2 * units;
+            continue;
+        }
         if (len - p >= 18 && cap - w >= 48) {
-            uint32_t consumed, units;
             if (utf8_block(s + p, d + w / 2, consumed, units)) {
                 p += consumed;
                 w += 2 * units;
@@ -280,12 +371,17 @@ TEXTCONV_AVX2 uint32_t utf16_to_utf8_avx2(const uint16_t *s, uint32_t len, uint8
     len &= ~1u;
     uint32_t r = 0, w = 0;
     while (r < len) {
-        if (len - r >= 32 && cap - w >= 16) {
+        if (len - r >= 32) {
             const __m256i v = load32(s + r / 2);
-            if (_mm256_testz_si256(v, _mm256_set1_epi16(static_cast<short>(0xFF80)))) {
+            if (cap - w >= 16 && _mm256_testz_si256(v, _mm256_set1_epi16(static_cast<short>(0xFF80)))) {
                 store16(d + w, _mm_packus_epi16(_mm256_castsi256_si128(v), _mm256_extracti128_si256(v, 1)));
                 r += 32;
                 w += 16;
+                continue;
+            }
+            if (cap - w >= 48 && _mm256_testz_si256(v, _mm256_set1_epi16(static_cast<short>(0xF800)))) {
+                w += utf16_block_two_bytes(v, d + w);
+                r += 32;
                 continue;
             }
         }
