@@ -255,6 +255,37 @@ TEST(EngineOracle, UnitsACharsetLacksBecomeQuestionMarks) {
     }
 }
 
+TEST(EngineOracle, UnitTextOfEveryLengthAndAlignment) {
+    // The terminator is found word by word: units whose bytes look like a
+    // 0 unit in part, at every start address, ended at every length.
+    const char16_t kinds[] = {0x0001, 0x0100, 0x8000, 0x7FFF, 0x00FF, 0xFF00, u'A'};
+    Oracle encode("UTF-8", "UTF-16LE");
+    for (size_t offset = 0; offset < 9; ++offset)
+        for (size_t length = 0; length < 70; ++length) {
+            std::u16string buffer(offset + length + 40, u'\x0101');
+            for (size_t i = 0; i < length; ++i) buffer[offset + i] = kinds[(i * 5 + offset) % 7];
+            buffer[offset + length] = 0;
+            const std::u16string text = buffer.substr(offset, length);
+            const uint16_t *in = reinterpret_cast<const uint16_t *>(buffer.data()) + offset;
+            char out[300];
+            char *q = out;
+            uint32_t room = sizeof out;
+            ASSERT_EQ(StringFromUnicodeToCharset(CHARSET_UTF8, &in, &q, &room), 1);
+            ASSERT_EQ(std::string(out, room), *encode(as_bytes(text)) + '\0') << offset << " " << length;
+            // The same units as a UTF-16 source, also at odd addresses.
+            for (size_t odd = 0; odd < 2; ++odd) {
+                const std::string bytes = std::string(odd, ' ') + as_bytes(buffer);
+                const char *src = bytes.data() + odd + 2 * offset;
+                std::u16string units(length + 8, u'\0');
+                uint16_t *dst = reinterpret_cast<uint16_t *>(units.data());
+                uint32_t unitRoom = static_cast<uint32_t>(units.size() * 2);
+                ASSERT_EQ(StringFromCharsetToUnicode(CHARSET_UTF16, &src, &dst, &unitRoom), 1);
+                ASSERT_EQ(units.substr(0, unitRoom / 2), text + u'\0')
+                    << offset << " " << length << " " << odd;
+            }
+        }
+}
+
 TEST(EngineOracle, SixteenBitSourceStaysInStepAfterARejectedUnit) {
     const std::u16string text =
         u"A\xDC00"
