@@ -205,21 +205,27 @@ TEXTCONV_API void apply_locale_name(const char *name);
 /* ===================================================================== */
 
 /* 0-terminated UTF-16 at *source to charset at *destination, terminator
- * converted along. Units the charset cannot hold become "?". *length in: room
- * in bytes; out on success: bytes written including the terminator, and both
- * pointers advanced past what was read and written. Returns 0 when no
- * converter exists (a message on stderr, nothing changed) or when the output
- * does not fit (nothing is ever written past the room). */
+ * converted along. Units the charset cannot hold become "?", one per unit.
+ * *length in: room in bytes; out on success: bytes written including the
+ * terminator, and both pointers advanced past what was read and written.
+ * Returns 0 when no converter exists (a message on stderr, nothing changed)
+ * or when the output does not fit: nothing is ever written past the room,
+ * *length then holds the bytes written by the last pass and the pointers
+ * that pass's start (passes restart after each "?"). */
 TEXTCONV_API int StringFromUnicodeToCharset(CharsetId charset, const uint16_t **source, char **destination,
                                             uint32_t *length);
 
 /* NUL-terminated text in charset (0-terminated 16-bit units for the UTF-16
- * ids) at *source to 0-terminated UTF-16 at *destination. Undecodable bytes
- * become U+FFFD; the converter's byte-order mark is removed (a UTF-8 source's
- * own leading mark is kept). *length in: room in bytes; out on success: bytes
- * written including the terminator. On failure returns 0; when converting had
- * begun, *length holds the bytes written by the last pass and the pointers
- * hold that pass's start. */
+ * ids) at *source to 0-terminated UTF-16 at *destination. Each undecodable
+ * byte (unit, for the UTF-16 ids) becomes U+FFFD; the converter's byte-order
+ * mark is removed (a UTF-8 source's own leading mark is kept). *length in:
+ * room in bytes, 2 x (characters + 1) suffices; out on success: bytes written
+ * including the terminator. Once a converter's mark has twice taken the
+ * terminator's room, the process stores every terminator itself and leaves
+ * both pointers on the terminators rather than past them. On failure returns
+ * 0 and writes nothing past the room; when converting had begun, *length
+ * holds the bytes written by the last pass and the pointers that pass's
+ * start. */
 TEXTCONV_API int StringFromCharsetToUnicode(CharsetId charset, const char **source, uint16_t **destination,
                                             uint32_t *length);
 
@@ -228,10 +234,11 @@ TEXTCONV_API int StringFromCharsetToUnicode(CharsetId charset, const char **sour
  * no such character or no converter exists. */
 TEXTCONV_API int FromUnicodeToCharset(CharsetId charset, uint32_t unit, char **destination);
 
-/* One character (up to 4 bytes) of charset at *source to one unit. Returns 1
- * with *length = 2 and *source advanced past the character, or past one byte
- * with U+FFFD for an undecodable byte; 0 when no converter exists or the
- * character is incomplete or longer than 4 bytes. */
+/* One character (up to 4 bytes) of charset at *source to one unit (the high
+ * surrogate of a character beyond U+FFFF). Returns 1 with *length = 2 and
+ * *source advanced past the character, or past one byte (one unit for the
+ * UTF-16 ids) with U+FFFD for an undecodable one; 0 when no converter exists
+ * or the character is incomplete or longer than 4 bytes. */
 TEXTCONV_API int FromCharsetToUnicode(CharsetId charset, const char **source, uint16_t *destination,
                                       uint32_t *length);
 
@@ -247,8 +254,9 @@ TEXTCONV_API int FromKOI8RToUnicode(const char **source, uint16_t *destination);
  * pages: 874 932 936 949 950 1250 1251 1252 (read as ISO-8859-1) 1255 1256.
  * *length in: room in bytes (at least 1); out: bytes of the result including
  * its terminator. Text that cannot be converted (unknown code page, no
- * converter, no memory) is copied unchanged, cut to the room and terminated.
- * Always returns 1. */
+ * converter, no memory, a result larger than the room) is copied unchanged,
+ * cut to the room and terminated, the rest of the room filled with NULs; a
+ * room of 0 gets nothing. Always returns 1. */
 TEXTCONV_API int StringFromServerCPToCharset(CharsetId charset, int32_t codePage, const char *source,
                                              char *destination, uint32_t *length);
 
