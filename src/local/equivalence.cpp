@@ -61,7 +61,10 @@ TEXTCONV_API int StringsEquivalent(const char *first, int32_t firstEncoding, con
             const auto *pb = reinterpret_cast<const unsigned char *>(b);
             while (*pa == *pb && *pa) {
                 const unsigned n = wellformed_length(pa);
-                if (n == 0 || std::memcmp(pa, pb, n) != 0) break;
+                // Byte by byte: the second string may end inside the sequence.
+                unsigned same = 1;
+                while (same < n && pa[same] == pb[same]) ++same;
+                if (n == 0 || same != n) break;
                 pa += n;
                 pb += n;
             }
