@@ -16,6 +16,8 @@ struct Paths {
 };
 
 constexpr Paths kScalar = {"scalar", utf8_to_utf16_scalar, utf16_to_utf8_scalar, latin1_to_utf8_scalar};
+constexpr Paths kWords = {"words", fast::utf8_to_utf16_words, fast::utf16_to_utf8_words,
+                          fast::latin1_to_utf8_words};
 #if defined(__x86_64__)
 constexpr Paths kSse2 = {"sse2", fast::utf8_to_utf16_sse2, fast::utf16_to_utf8_sse2,
                          fast::latin1_to_utf8_sse2};
@@ -29,7 +31,7 @@ const Paths *choose() {
 #if defined(__x86_64__)
     return fast::avx2_available() ? &kAvx2 : &kSse2;
 #else
-    return &kScalar;
+    return &kWords;
 #endif
 }
 

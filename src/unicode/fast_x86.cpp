@@ -38,27 +38,6 @@ TEXTCONV_AVX2 inline __m256i two_shuffles(const Shuffle &low, const Shuffle &hig
     return _mm256_inserti128_si256(_mm256_castsi128_si256(load16(low.index)), load16(high.index), 1);
 }
 
-// Scalar steps over at least `bytes` of input (or up to its end).
-inline uint32_t utf8_scalar_stretch(const uint8_t *s, uint32_t len, uint32_t &p, uint16_t *d, uint32_t cap,
-                                    uint32_t &w, uint32_t bytes) {
-    const uint32_t stop = len - p > bytes ? p + bytes : len;
-    while (p < stop) {
-        uint32_t r = utf8_decode_step(s, len, p, d, cap, w);
-        if (r != kStepContinue) return r;
-    }
-    return kStepContinue;
-}
-
-inline uint32_t utf16_scalar_stretch(const uint16_t *s, uint32_t len, uint32_t &r, uint8_t *d, uint32_t cap,
-                                     uint32_t &w, uint32_t bytes) {
-    const uint32_t stop = len - r > bytes ? r + bytes : len;
-    while (r < stop) {
-        uint32_t res = utf16_encode_step(s, len, r, d, cap, w);
-        if (res != kStepContinue) return res;
-    }
-    return kStepContinue;
-}
-
 // Unsigned lo <= b <= hi, per byte.
 inline __m128i bytes_in_range(__m128i b, uint8_t lo, uint8_t hi) {
     const __m128i x = _mm_sub_epi8(b, _mm_set1_epi8(static_cast<char>(lo)));

@@ -21,12 +21,18 @@ uint32_t utf16_to_utf8(const uint16_t *src, uint32_t len, uint8_t *dst, uint32_t
 uint32_t latin1_to_utf8_scalar(const uint8_t *src, uint32_t len, uint8_t *dst);
 uint32_t latin1_to_utf8(const uint8_t *src, uint32_t len, uint8_t *dst);
 
-// Which implementation the dispatched functions use: "scalar", "sse2" or
-// "avx2". Chosen once, at the first call; TEXTCONV_FORCE_SCALAR=1 in the
+// Which implementation the dispatched functions use: "scalar", "words",
+// "sse2" or "avx2". Chosen once, at the first call; TEXTCONV_FORCE_SCALAR=1 in the
 // environment forces the scalar code.
 const char *active_path();
 
 namespace fast {
+// Word-at-a-time ASCII runs, any machine.
+uint32_t utf8_to_utf16_words(const uint8_t *src, uint32_t len, uint16_t *dst, uint32_t cap,
+                             uint32_t *written);
+uint32_t utf16_to_utf8_words(const uint16_t *src, uint32_t len, uint8_t *dst, uint32_t cap,
+                             uint32_t *written);
+uint32_t latin1_to_utf8_words(const uint8_t *src, uint32_t len, uint8_t *dst);
 #if defined(__x86_64__)
 bool avx2_available();
 uint32_t utf8_to_utf16_sse2(const uint8_t *src, uint32_t len, uint16_t *dst, uint32_t cap, uint32_t *written);

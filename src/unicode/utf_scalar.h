@@ -19,6 +19,13 @@ inline constexpr uint32_t kStepContinue = 0xFFFFFFFFu;
 inline uint32_t utf8_decode_step(const uint8_t *src, uint32_t len, uint32_t &p, uint16_t *dst, uint32_t cap,
                                  uint32_t &w) {
     const uint32_t lead = src[p];
+    if (lead < 0x80) {  // the common case, same outcome as the general path
+        if (cap - w < 2) return TEXTCONV_UTF_TARGET_FULL;
+        dst[w / 2] = static_cast<uint16_t>(lead);
+        w += 2;
+        p += 1;
+        return kStepContinue;
+    }
     const uint32_t t = static_cast<uint32_t>(utf8TrailingByteCount[lead]);
     const uint32_t avail = len - p - 1;  // bytes after the lead
     // A trailing byte must look like one (10xxxxxx). Check those that are
@@ -71,6 +78,11 @@ inline uint32_t utf16_encode_step(const uint16_t *src, uint32_t len, uint32_t &r
                                   uint32_t &w) {
     uint32_t u = src[r / 2];
     r += 2;
+    if (u < 0x80) {
+        if (cap == w) return TEXTCONV_UTF_TARGET_FULL;
+        dst[w++] = static_cast<uint8_t>(u);
+        return kStepContinue;
+    }
     if (u >= 0xD800 && u <= 0xDBFF && r < len) {
         const uint32_t next = src[r / 2];
         if (next >= 0xDC00 && next <= 0xDFFF) {
@@ -87,6 +99,27 @@ inline uint32_t utf16_encode_step(const uint16_t *src, uint32_t len, uint32_t &r
         u >>= 6;
     }
     out[0] = static_cast<uint8_t>(u | utf8LeadByteMark[n]);
+    return kStepContinue;
+}
+
+// Scalar steps over at least `bytes` of input (or up to its end).
+inline uint32_t utf8_scalar_stretch(const uint8_t *s, uint32_t len, uint32_t &p, uint16_t *d, uint32_t cap,
+                                    uint32_t &w, uint32_t bytes) {
+    const uint32_t stop = len - p > bytes ? p + bytes : len;
+    while (p < stop) {
+        uint32_t r = utf8_decode_step(s, len, p, d, cap, w);
+        if (r != kStepContinue) return r;
+    }
+    return kStepContinue;
+}
+
+inline uint32_t utf16_scalar_stretch(const uint16_t *s, uint32_t len, uint32_t &r, uint8_t *d, uint32_t cap,
+                                     uint32_t &w, uint32_t bytes) {
+    const uint32_t stop = len - r > bytes ? r + bytes : len;
+    while (r < stop) {
+        uint32_t res = utf16_encode_step(s, len, r, d, cap, w);
+        if (res != kStepContinue) return res;
+    }
     return kStepContinue;
 }
 
