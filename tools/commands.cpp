@@ -133,10 +133,11 @@ int run_escape(const EscapeOptions &options) {
         throw Failure(kExitUsage, "escape reads text in byte charsets; convert UTF-16 text first");
     if (options.haveText == !options.inputFile.empty())
         throw Failure(kExitUsage, "give either TEXT or -i FILE");
-    require_converter(charset_name(charset.id), "UTF-16", platform_decodes(charset.id), options.policy,
-                      open_decoder, charset.id);
-    require_converter("UTF-16", charset_name(charset.id), platform_encodes(charset.id), options.policy,
-                      open_encoder, charset.id);
+    // Without the converters the library copies the text unchanged.
+    const bool usable = require_converter(charset_name(charset.id), "UTF-16", platform_decodes(charset.id),
+                                          options.policy, open_decoder, charset.id) &&
+                        require_converter("UTF-16", charset_name(charset.id), platform_encodes(charset.id),
+                                          options.policy, open_encoder, charset.id);
 
     const std::string text = options.haveText ? options.text : read_file(options.inputFile);
     const size_t nul = text.find('\0');
@@ -176,7 +177,7 @@ int run_escape(const EscapeOptions &options) {
     }
     if (options.haveText) out += '\n';
     std::fwrite(out.data(), 1, out.size(), stdout);
-    if (failed)
+    if (failed && usable)
         throw Failure(kExitBadInput,
                       "some text could not be read as " + charset.label + " and was copied unchanged");
     return kExitDone;

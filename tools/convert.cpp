@@ -637,6 +637,15 @@ int run_convert(const ConvertOptions &options) {
 
     Output out;
     if (!options.output.empty() && options.output != "-") {
+        // Opening the output truncates it: never when it is one of the inputs.
+        struct stat target {};
+        if (stat(options.output.c_str(), &target) == 0)
+            for (const std::string &path : options.inputs) {
+                struct stat source {};
+                if (stat(path.c_str(), &source) == 0 && source.st_dev == target.st_dev &&
+                    source.st_ino == target.st_ino)
+                    throw Failure(kExitUsage, "the output " + options.output + " is also an input");
+            }
         out.name = options.output;
         out.file = std::fopen(options.output.c_str(), "wb");
         if (!out.file)
