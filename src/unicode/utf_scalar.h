@@ -16,8 +16,8 @@ inline constexpr uint32_t kStepContinue = 0xFFFFFFFFu;
 // Decodes the sequence at src[p] (p < len) into dst, advancing p and w (bytes
 // written; w never exceeds cap, and cap may be odd). Returns kStepContinue or TEXTCONV_UTF_SOURCE_INCOMPLETE
 // / TEXTCONV_UTF_TARGET_FULL.
-inline uint32_t utf8_decode_step(const uint8_t *src, uint32_t len, uint32_t &p, uint16_t *dst, uint32_t cap,
-                                 uint32_t &w) {
+[[gnu::always_inline]] inline uint32_t utf8_decode_step(const uint8_t *src, uint32_t len, uint32_t &p,
+                                                        uint16_t *dst, uint32_t cap, uint32_t &w) {
     const uint32_t lead = src[p];
     if (lead < 0x80) {  // the common case, same outcome as the general path
         if (cap - w < 2) return TEXTCONV_UTF_TARGET_FULL;
@@ -28,6 +28,25 @@ inline uint32_t utf8_decode_step(const uint8_t *src, uint32_t len, uint32_t &p, 
     }
     const uint32_t t = static_cast<uint32_t>(utf8TrailingByteCount[lead]);
     const uint32_t avail = len - p - 1;  // bytes after the lead
+    // Well-formed 2- and 3-byte sequences, the bulk of non-ASCII text, take a
+    // short road to the same outcome; everything else the general one.
+    if (t == 1 && avail >= 1 && lead >= 0xC2 && (src[p + 1] & 0xC0) == 0x80) {
+        if (cap - w < 2) return TEXTCONV_UTF_TARGET_FULL;
+        dst[w / 2] = static_cast<uint16_t>(((lead & 0x1F) << 6) | (src[p + 1] & 0x3F));
+        w += 2;
+        p += 2;
+        return kStepContinue;
+    }
+    if (t == 2 && avail >= 2 && (src[p + 1] & 0xC0) == 0x80 && (src[p + 2] & 0xC0) == 0x80) {
+        const uint32_t v = ((lead & 0x0F) << 12) | ((src[p + 1] & 0x3F) << 6) | (src[p + 2] & 0x3F);
+        if (v >= 0x800 && (v < 0xD800 || v > 0xDFFF)) {
+            if (cap - w < 2) return TEXTCONV_UTF_TARGET_FULL;
+            dst[w / 2] = static_cast<uint16_t>(v);
+            w += 2;
+            p += 3;
+            return kStepContinue;
+        }
+    }
     // A trailing byte must look like one (10xxxxxx). Check those that are
     // there first: a sequence broken by another byte is illegal at once, one
     // that only runs past the end is incomplete.
@@ -74,8 +93,8 @@ inline uint32_t utf8_decode_step(const uint8_t *src, uint32_t len, uint32_t &p, 
 }
 
 // Encodes the unit (or pair) at src[r / 2] (r < len, in bytes) into dst.
-inline uint32_t utf16_encode_step(const uint16_t *src, uint32_t len, uint32_t &r, uint8_t *dst, uint32_t cap,
-                                  uint32_t &w) {
+[[gnu::always_inline]] inline uint32_t utf16_encode_step(const uint16_t *src, uint32_t len, uint32_t &r,
+                                                         uint8_t *dst, uint32_t cap, uint32_t &w) {
     uint32_t u = src[r / 2];
     r += 2;
     if (u < 0x80) {
