@@ -87,7 +87,8 @@ bool unicode_to_multibyte(uint16_t unit, uint32_t request, uint8_t *kind, uint8_
     if (!unicode_to_eucjp(unit, euc) || !classify_eucjp(euc, &found, &jis)) return false;
     if (request == MB_KIND_SJIS) {
         // A printable ASCII character becomes its own single byte.
-        if (!jis_to_sjis(found == MB_KIND_ASCII ? uint8_t{MB_KIND_SINGLE} : found, &jis, code, length)) return false;
+        if (!jis_to_sjis(found == MB_KIND_ASCII ? uint8_t{MB_KIND_SINGLE} : found, &jis, code, length))
+            return false;
         if (kind) *kind = MB_KIND_SJIS;
         return true;
     }

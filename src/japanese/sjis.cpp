@@ -6,32 +6,6 @@
 
 namespace textconv::japanese {
 
-bool sjis_to_jis(const uint8_t *sjis, uint8_t *kind, JisCode *jis, uint8_t *consumed) {
-    const uint8_t lead = sjis[0];
-    if (is_sjis_single(lead)) {
-        *kind = MB_KIND_SINGLE;
-        jis->byte[0] = lead;
-        *consumed = 1;
-        return true;
-    }
-    if (!is_sjis_lead(lead)) return false;
-    // A trail byte outside the Shift-JIS ranges (the terminator, ASCII
-    // punctuation, 0x7F, 0xFD..0xFF) makes the lead byte invalid on its own,
-    // so the byte after it is read again as a character of its own.
-    const uint8_t trail = sjis[1];
-    if (!is_sjis_trail(trail)) return false;
-    // Each lead byte covers two rows: trails up to 0x9E the odd row, from
-    // 0x9F the even one.
-    const uint8_t base = lead <= 0x9F ? 0x70 : 0xB0;
-    const uint8_t evenRow = trail >= 0x9F;
-    const uint8_t cellOffset = trail < 0x80 ? 0x1F : (trail <= 0x9E ? 0x20 : 0x7E);
-    *kind = MB_KIND_JISX0208;
-    jis->byte[0] = static_cast<uint8_t>(2 * (lead - base) - 32 - (evenRow ? 0 : 1));
-    jis->byte[1] = static_cast<uint8_t>(trail - 0x20 - cellOffset);
-    *consumed = 2;
-    return true;
-}
-
 bool jis_to_sjis(uint32_t kind, const JisCode *jis, uint8_t *sjis, uint8_t *length) {
     if (kind == MB_KIND_SINGLE) {
         if (!is_sjis_single(jis->byte[0])) return false;

@@ -8,17 +8,15 @@
 namespace textconv::japanese {
 
 uint8_t eucjpFirstUse = 1;
+uint16_t x0208Units[kCells * kCells];
+uint16_t katakanaUnits[0xDF - 0xA1 + 1];
 
 namespace {
 
-// The EUC-JP converter is stateless, so the unit it gives for a row/cell
-// (or katakana byte) is kept here once known: 0 not yet asked, kNoCharacter
-// rejected. Only ever filled through the open converter, after its first-use
-// step, so every observable step of a conversion has happened before the
-// first lookup can hit.
-uint16_t x0208Units[kCells * kCells];
+// JIS X 0212 answers, kept like those of JIS X 0208 (japanese.h). Only ever
+// filled through the open converter, after its first-use step, so every
+// observable step of a conversion has happened before a lookup can hit.
 uint16_t x0212Units[kCells * kCells];
-uint16_t katakanaUnits[0xDF - 0xA1 + 1];
 
 iconv_t decoder() {
     const iconv_t cell = eucjpToUnicodeConverter;

@@ -24,12 +24,31 @@ uint16_t *sjis_slot(const uint8_t *p) {
     return nullptr;
 }
 
+// A known unit in UTF-8: the bytes FromUCS4toUTF8 writes for it, without a
+// call through the symbol table for every character of a long text.
+inline uint8_t put_utf8(uint16_t unit, char *out) {
+    if (unit < 0x80) {
+        out[0] = static_cast<char>(unit);
+        return 1;
+    }
+    if (unit < 0x800) {
+        out[0] = static_cast<char>(0xC0 | unit >> 6);
+        out[1] = static_cast<char>(0x80 | (unit & 0x3F));
+        return 2;
+    }
+    out[0] = static_cast<char>(0xE0 | unit >> 12);
+    out[1] = static_cast<char>(0x80 | (unit >> 6 & 0x3F));
+    out[2] = static_cast<char>(0x80 | (unit & 0x3F));
+    return 3;
+}
+
 uint16_t sjis_of_unit(uint16_t unit) {
     if (unit <= 0x7F) return 0x100 | unit;
     uint8_t euc[3], kind, sjis[2], length;
     JisCode jis;
     if (!unicode_to_eucjp(unit, euc) || !classify_eucjp(euc, &kind, &jis)) return kSjisSpace;
-    if (!jis_to_sjis(kind == MB_KIND_ASCII ? uint8_t{MB_KIND_SINGLE} : kind, &jis, sjis, &length)) return kSjisSpace;
+    if (!jis_to_sjis(kind == MB_KIND_ASCII ? uint8_t{MB_KIND_SINGLE} : kind, &jis, sjis, &length))
+        return kSjisSpace;
     return length == 1 ? 0x100 | sjis[0] : static_cast<uint16_t>(sjis[0] << 8 | sjis[1]);
 }
 
@@ -42,6 +61,11 @@ uint32_t eucjp_to_utf8(const uint8_t *euc, char *utf8, uint8_t *count) {
     }
     uint16_t unit;
     uint32_t taken;
+    if (is_euc_byte(b0) && b0 != 0xAD && is_euc_byte(euc[1]) && decoder_warm() &&
+        (unit = x0208Units[(b0 - 0xA1) * kCells + (euc[1] - 0xA1)]) != 0) {
+        *count = put_utf8(unit, utf8);
+        return 2;
+    }
     // A character cut short, by the terminator or by an ASCII byte, cannot
     // start here: nothing after the terminator is read, no ASCII byte is
     // taken into a bad sequence, and no more than three UTF-8 bytes are
@@ -115,6 +139,14 @@ TEXTCONV_API int StringFromSJISToUTF8(const char *sjis, char *utf8, uint32_t *le
         if (!sjis_to_jis(in, &kind, &jis, &consumed)) {
             *length = static_cast<uint32_t>(out - utf8) + 1;
             return 0;
+        }
+        if (kind == MB_KIND_JISX0208 && jis.byte[0] != 13 && decoder_warm()) {
+            const uint16_t unit = x0208Units[(jis.byte[0] - 1) * kCells + (jis.byte[1] - 1)];
+            if (unit != 0) {
+                out += put_utf8(unit, out);
+                in += consumed;
+                continue;
+            }
         }
         if (kind == MB_KIND_SINGLE && is_katakana(jis.byte[0])) {
             euc[0] = 0x8E;
