@@ -94,8 +94,12 @@ TEXTCONV_API extern const uint32_t conversions_availability;
 #define TEXTCONV_UTF_TARGET_FULL 2       /* the next output does not fit */
 
 /* Decodes sourceLength bytes of UTF-8 into UTF-16 units. targetCapacity is in
- * bytes. Ill-formed sequences become U+FFFD; decoding resumes right after the
- * lead byte, so every ASCII byte of the input comes out as itself. No
+ * bytes. Ill-formed sequences (a trailing byte not of the form 10xxxxxx, an
+ * overlong form, a surrogate, a stray trailing byte) give one U+FFFD and
+ * decoding resumes right after the lead byte, so every ASCII byte of the
+ * input comes out as itself. A 4- to 6-byte sequence of a value above
+ * U+10FFFF gives one U+FFFD and is consumed whole. Returns TEXTCONV_UTF_SOURCE_INCOMPLETE when
+ * the input ends inside a sequence whose bytes so far are well formed. No
  * terminator is added (a NUL is converted only if counted in sourceLength).
  * *written (bytes) is stored only on TEXTCONV_UTF_DONE; on TARGET_FULL the
  * units already produced stay in the target. */
@@ -120,7 +124,11 @@ TEXTCONV_API int StringFromUnicodeToUTF8(const uint16_t *source, char *target, u
 
 /* One UTF-8 character at *cursor to one or two units in target (room for 2
  * units). *cursor always advances past the sequence (never past a NUL).
- * *written receives 2 or 4 (bytes) on success only. Returns 1 or 0. */
+ * *written receives 2 or 4 (bytes) on success only. Returns 1 or 0.
+ * A sequence cut short by the NUL fails with *cursor on the NUL; a lead byte
+ * followed by a byte that is not a trailing byte gives one U+FFFD and moves
+ * *cursor past the lead byte only. An overlong or surrogate sequence of 3 or
+ * more bytes fails (its U+FFFD units do not fit in 2), *cursor past it. */
 TEXTCONV_API int FromUTF8ToUnicode(const char **cursor, uint16_t *target, uint32_t *written);
 
 /* The low 16 bits of unit, encoded at *cursor (1 to 3 bytes, no terminator);
@@ -131,8 +139,10 @@ TEXTCONV_API int FromUnicodeToUTF8(uint32_t unit, char **cursor);
  * terminators included) to a NEW list of 0-terminated UTF-16 strings. On
  * success *list points to the new block (from HostMalloc, the caller releases
  * it with HostFree; read it as uint16_t units) and *length is its byte length.
- * The input list is not changed or released. On failure returns 0 and leaves
- * *list and *length unchanged. */
+ * The input list is not changed or released. A last string without its NUL
+ * gets its 0 unit all the same. On failure (a sequence cut short by a
+ * terminator or by the end of the list, HostMalloc returning null) returns 0
+ * and leaves *list and *length unchanged. */
 TEXTCONV_API int StringListFromUTF8toUTF16(char **list, uint32_t *length);
 
 /* ===================================================================== */
