@@ -136,7 +136,7 @@ class Pipeline {
         }
         // U+FFFD as each side writes it, to tell the text's own U+FFFD from
         // the substitutes the conversion puts in.
-        if (decodes_ && f != CHARSET_UTF8) replacementIn_ = encoded_replacement(f);
+        if (decodes_ && f != CHARSET_UTF8 && platform_encodes(f)) replacementIn_ = encoded_replacement(f);
         // (Not for the UTF-16 targets: their converter writes a byte-order mark
         // in front of its first output only, which belongs to the text.)
         if (encodes_ && t != CHARSET_UTF8 && !is_utf16_family(t)) replacementOut_ = encoded_replacement(t);
