@@ -28,6 +28,17 @@
 
 namespace fuzz {
 
+// With TEXTCONV_FUZZ_TRACE set, prints a labelled hex dump on stderr: run a
+// reproducer with it to see the values behind a broken invariant.
+inline void trace(const char *label, const void *data, size_t size) {
+    static const bool on = std::getenv("TEXTCONV_FUZZ_TRACE") != nullptr;
+    if (!on) return;
+    std::fprintf(stderr, "%s:", label);
+    for (size_t i = 0; i < size; ++i) std::fprintf(stderr, " %02x", static_cast<const uint8_t *>(data)[i]);
+    std::fprintf(stderr, "\n");
+}
+inline void trace(const char *label, const std::string &s) { trace(label, s.data(), s.size()); }
+
 // Reads the fuzzer's bytes front to back; past the end every read gives 0.
 class Reader {
   public:
