@@ -147,6 +147,42 @@ TEST(LOCAL_SUITE, LocalToUTF8AgreesWithIconv) {
     EXPECT_GT(checked, 10);
 }
 
+// Whole corpus files kept in the local charset itself (KOI8-R, Latin-1,
+// EUC-JP), line by line, both ways, against glibc.
+TEST(LOCAL_SUITE, NativeCorpusFilesBothWays) {
+    const char *suffix = kLocal == CHARSET_KOI8R    ? ".koi8r.txt"
+                         : kLocal == CHARSET_LATIN1 ? ".latin1.txt"
+                         : kLocal == CHARSET_EUCJP  ? ".eucjp.txt"
+                                                    : nullptr;
+    if (!suffix) GTEST_SKIP() << "no corpus file in " << kCharset;
+    auto files = testsupport::corpus_files(suffix);
+    if (files.empty()) GTEST_SKIP() << "corpora not available";
+    size_t checked = 0;
+    for (const std::string &name : files) {
+        auto text = testsupport::read_corpus(name);
+        size_t start = 0;
+        while (start < text->size()) {
+            size_t end = text->find('\n', start);
+            if (end == std::string::npos) end = text->size();
+            const std::string line = text->substr(start, end - start);
+            start = end + 1;
+            auto utf8 = testsupport::iconv_convert("UTF-8", kCharset, line);
+            ASSERT_TRUE(utf8) << name << ": " << hex(line);
+            std::vector<char> target(3 * line.size() + 1);
+            uint32_t length = static_cast<uint32_t>(target.size());
+            ASSERT_EQ(StringFromLocalToUTF8(line.c_str(), target.data(), &length), 1)
+                << name << ": " << hex(line);
+            ASSERT_EQ(std::string(target.data(), length - 1), *utf8) << name << ": " << hex(line);
+            std::vector<char> back(4 * utf8->size() + 1);
+            ASSERT_EQ(StringFromUTF8ToLocal(utf8->c_str(), back.data(), &length), 1)
+                << name << ": " << hex(line);
+            ASSERT_EQ(std::string(back.data(), length - 1), line) << name;
+            ++checked;
+        }
+    }
+    EXPECT_GT(checked, 1000u);
+}
+
 // Every single byte: the fast paths and the path through UTF-16 alike.
 TEST(LOCAL_SUITE, LocalToUTF8EverySingleByte) {
     for (int b = 1; b < 256; ++b) {
