@@ -8,6 +8,10 @@
 #include <stdio.h>
 #include <string.h>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "engine/engine.h"
 #include "frame/registry.h"
 
@@ -29,27 +33,43 @@ uint16_t unit_at(const char *p, size_t index) {
 
 void store_unit(char *p, uint16_t unit) { memcpy(p, &unit, 2); }
 
-// Units of a 0-terminated UTF-16 string, terminator included. Two machine
-// words are tested at a time for a 0 unit: the scan is a small part of the
-// conversion's cost even for short strings. Like the C library's strlen, it
-// reads whole aligned blocks, which may extend past the terminator but never
-// into another page; hence no address sanitizing here.
+// Units of a 0-terminated UTF-16 string, terminator included. The scan tests
+// a whole aligned block for a 0 unit at a time (64 bytes with SSE2, else two
+// machine words), so that it stays a small part of the conversion's cost.
+// Like the C library's strlen it may read past the terminator, but only
+// within the aligned block that holds it, never into another page: hence no
+// address sanitizing here.
+#if defined(__SSE2__)
+constexpr uintptr_t kBlock = 64;
+#else
 using Word = uintptr_t;
 typedef Word AliasWord __attribute__((may_alias));
 constexpr Word kLowBits = ~Word{0} / 0xFFFF;  // 0x0001 in every unit
 constexpr Word kHighBits = kLowBits << 15;    // 0x8000 in every unit
 constexpr uintptr_t kBlock = 2 * sizeof(Word);
+#endif
 
 __attribute__((no_sanitize("address"))) size_t unit_count(const uint16_t *text) {
     const uint16_t *p = text;
     for (; reinterpret_cast<uintptr_t>(p) % kBlock != 0; ++p)
         if (*p == 0) return static_cast<size_t>(p - text) + 1;
-    const auto *w = reinterpret_cast<const AliasWord *>(p);
-    for (;; w += 2) {
+#if defined(__SSE2__)
+    const __m128i zero = _mm_setzero_si128();
+    for (;; p += kBlock / 2) {
+        const auto *v = reinterpret_cast<const __m128i *>(p);
+        const __m128i found =
+            _mm_or_si128(_mm_or_si128(_mm_cmpeq_epi16(v[0], zero), _mm_cmpeq_epi16(v[1], zero)),
+                         _mm_or_si128(_mm_cmpeq_epi16(v[2], zero), _mm_cmpeq_epi16(v[3], zero)));
+        if (_mm_movemask_epi8(found) != 0) break;
+    }
+#else
+    for (;; p += kBlock / 2) {
+        const auto *w = reinterpret_cast<const AliasWord *>(p);
         const Word a = w[0], b = w[1];
         if ((((a - kLowBits) & ~a) | ((b - kLowBits) & ~b)) & kHighBits) break;
     }
-    for (p = reinterpret_cast<const uint16_t *>(w); *p != 0;) ++p;
+#endif
+    while (*p != 0) ++p;
     return static_cast<size_t>(p - text) + 1;
 }
 
