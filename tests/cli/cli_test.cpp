@@ -78,11 +78,12 @@ Outcome tool(const std::vector<std::string> &args, const std::string &input = ""
     posix_spawn_file_actions_addopen(&actions, 0, in.c_str(), O_RDONLY, 0);
     posix_spawn_file_actions_addopen(&actions, 1, out.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
     posix_spawn_file_actions_addopen(&actions, 2, err.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-    const std::string here = get_current_dir_name();
+    char here[4096] = "/";
+    if (!getcwd(here, sizeof here)) ADD_FAILURE() << "getcwd";
     if (!cwd.empty() && chdir(cwd.c_str()) != 0) ADD_FAILURE() << "chdir " << cwd;
     pid_t pid = 0;
     int rc = posix_spawn(&pid, argv[0], &actions, nullptr, argv.data(), envp.data());
-    if (!cwd.empty() && chdir(here.c_str()) != 0) ADD_FAILURE() << "chdir back";
+    if (!cwd.empty() && chdir(here) != 0) ADD_FAILURE() << "chdir back";
     posix_spawn_file_actions_destroy(&actions);
     Outcome run;
     if (rc != 0) {
