@@ -186,11 +186,11 @@ const Differential kDifferentials[] = {
 
 void PrintTo(const Differential &d, std::ostream *os) { *os << d.name; }
 
-class ConvertMatchesIconv : public testing::TestWithParam<Differential> {};
+class CliConvertMatchesIconv : public testing::TestWithParam<Differential> {};
 
 // Whole files as arguments, and standard input in small chunks that cut long
 // lines between characters.
-TEST_P(ConvertMatchesIconv, ByteForByte) {
+TEST_P(CliConvertMatchesIconv, ByteForByte) {
     REQUIRE_ICONV();
     const Differential &c = GetParam();
     std::string text;
@@ -218,11 +218,11 @@ TEST_P(ConvertMatchesIconv, ByteForByte) {
     EXPECT_TRUE(chunked.out == expected) << "chunked output differs";
 }
 
-INSTANTIATE_TEST_SUITE_P(Texts, ConvertMatchesIconv, testing::ValuesIn(kDifferentials),
+INSTANTIATE_TEST_SUITE_P(Texts, CliConvertMatchesIconv, testing::ValuesIn(kDifferentials),
                          [](const testing::TestParamInfo<Differential> &info) { return info.param.name; });
 
 // Every KOI8-R byte, both ways.
-TEST(ConvertExhaustive, EveryKoi8rByte) {
+TEST(CliConvertExhaustive, EveryKoi8rByte) {
     REQUIRE_ICONV();
     std::string koi8r;
     for (int b = 0x20; b <= 0xFF; ++b) {
@@ -267,7 +267,7 @@ void expect_lines_match(const std::string &input, const std::vector<std::string>
     EXPECT_NE(run.err.find(report), std::string::npos) << run.err;
 }
 
-TEST(ConvertExhaustive, EveryShiftJisDoubleByteCode) {
+TEST(CliConvertExhaustive, EveryShiftJisDoubleByteCode) {
     std::string input;
     for (int lead = 0x81; lead <= 0xEF; ++lead) {
         if (lead > 0x9F && lead < 0xE0) continue;
@@ -280,7 +280,7 @@ TEST(ConvertExhaustive, EveryShiftJisDoubleByteCode) {
                        "\xEF\xBF\xBF", 0x87);
 }
 
-TEST(ConvertExhaustive, EveryEucjpDoubleByteCode) {
+TEST(CliConvertExhaustive, EveryEucjpDoubleByteCode) {
     std::string input;
     for (int lead = 0xA1; lead <= 0xFE; ++lead)
         for (int trail = 0xA1; trail <= 0xFE; ++trail)
@@ -317,7 +317,7 @@ const Substitution kSubstitutions[] = {
     {"latin1", "utf8", "\xE9\n", "\xC3\xA9\n", 0},
 };
 
-TEST(ConvertSubstitutions, CountedAndStrict) {
+TEST(CliConvertSubstitutions, CountedAndStrict) {
     for (const Substitution &s : kSubstitutions) {
         SCOPED_TRACE(testsupport::hex(std::string(s.input)) + " " + s.from + " to " + s.to);
         Outcome plain = tool({"convert", "-f", s.from, "-t", s.to}, s.input);
@@ -341,7 +341,7 @@ TEST(ConvertSubstitutions, CountedAndStrict) {
 
 // ---- bad input, usage, missing converters ----
 
-TEST(ConvertErrors, NulByteIsReportedWithItsOffset) {
+TEST(CliConvertErrors, NulByteIsReportedWithItsOffset) {
     std::string text;
     for (int i = 0; i < 20000; ++i) text += "line\n";  // beyond the first chunk
     Outcome late = tool({"convert", "-f", "utf8", "-t", "latin1"}, text + std::string("ab\0c", 4));
@@ -353,7 +353,7 @@ TEST(ConvertErrors, NulByteIsReportedWithItsOffset) {
     EXPECT_NE(units.err.find("0 unit at byte offset 4"), std::string::npos) << units.err;
 }
 
-TEST(ConvertErrors, FilesNamesAndUsage) {
+TEST(CliConvertErrors, FilesNamesAndUsage) {
     Outcome missing = tool({"convert", "-f", "utf8", "-t", "utf8", "/nonexistent/in.txt"});
     EXPECT_EQ(missing.status, 4);
     EXPECT_NE(missing.err.find("/nonexistent/in.txt"), std::string::npos);
@@ -375,7 +375,7 @@ TEST(ConvertErrors, FilesNamesAndUsage) {
     EXPECT_EQ(slurp(o), "\xC3\xA9\n\xC3\xBC\n");
 }
 
-TEST(ConvertErrors, MissingConverterStopsOrContinues) {
+TEST(CliConvertErrors, MissingConverterStopsOrContinues) {
     REQUIRE_ICONV();
     if (!oracle("iconv -f UTF-8 -t UTF16-LE && echo yes", "a").empty())
         GTEST_SKIP() << "this system has a UTF16-LE converter";
@@ -391,7 +391,7 @@ TEST(ConvertErrors, MissingConverterStopsOrContinues) {
               1);
 }
 
-TEST(ConvertProgress, ForcedBarReachesTheEndAndClears) {
+TEST(CliConvertProgress, ForcedBarReachesTheEndAndClears) {
     std::string text(300000, 'x');
     Outcome run = tool({"convert", "--progress", "-f", "latin1", "-t", "utf8", write_temp("big.txt", text)});
     EXPECT_EQ(run.status, 0);
@@ -403,7 +403,7 @@ TEST(ConvertProgress, ForcedBarReachesTheEndAndClears) {
 
 // ---- the other commands ----
 
-TEST(Commands, HelpAndVersion) {
+TEST(CliCommands, HelpAndVersion) {
     Outcome help = tool({"--help"});
     EXPECT_EQ(help.status, 0);
     for (const char *command : {"convert", "list", "locale", "escape", "equal", "jis", "demo"}) {
@@ -419,7 +419,7 @@ TEST(Commands, HelpAndVersion) {
 
 // Every charset listed, and its converter columns tell what the iconv program
 // can do on this system.
-TEST(Commands, ListAgreesWithThePlatform) {
+TEST(CliCommands, ListAgreesWithThePlatform) {
     REQUIRE_ICONV();
     Outcome run = tool({"list"});
     ASSERT_EQ(run.status, 0);
@@ -438,7 +438,7 @@ TEST(Commands, ListAgreesWithThePlatform) {
     }
 }
 
-TEST(Commands, LocaleTellsHowItDecided) {
+TEST(CliCommands, LocaleTellsHowItDecided) {
     Outcome c = tool({"locale"}, "", {"LANG", "LC_ALL=C", "LC_CTYPE"});
     EXPECT_EQ(c.status, 0);
     EXPECT_NE(c.out.find("local encoding:   1 ISO-8859-1"), std::string::npos) << c.out;
@@ -449,7 +449,7 @@ TEST(Commands, LocaleTellsHowItDecided) {
     EXPECT_EQ(tool({"locale"}, "", {"LANG", "LC_ALL=C.utf8"}).out.find("after rewrite"), std::string::npos);
 }
 
-TEST(Commands, EscapeMarksRuns) {
+TEST(CliCommands, EscapeMarksRuns) {
     Outcome hebrew = tool({"escape", "-f", "iso8859-8", "-i",
                            std::string(TEXTCONV_SOURCE_DIR) + "/samples/hebrew.iso8859-8.txt"});
     EXPECT_EQ(hebrew.status, 0);
@@ -462,7 +462,7 @@ TEST(Commands, EscapeMarksRuns) {
     EXPECT_EQ(tool({"escape"}).status, 2);
 }
 
-TEST(Commands, EqualExitStatus) {
+TEST(CliCommands, EqualExitStatus) {
     struct Case {
         std::vector<std::string> args;
         int status;
@@ -488,7 +488,7 @@ TEST(Commands, EqualExitStatus) {
 
 // Every way of naming a character shows the same forms, and the forms agree
 // with the iconv program.
-TEST(Commands, JisFormsAgree) {
+TEST(CliCommands, JisFormsAgree) {
     REQUIRE_ICONV();
     const std::string utf8 =
         "\xE9\xA7\x85\xE3\x81\xAE\xEF\xBD\xB6\xE2\x91\xA0";  // three JIS kinds and row 13
@@ -522,7 +522,7 @@ TEST(Commands, JisFormsAgree) {
     EXPECT_EQ(tool({"jis", "0x8"}).status, 2);
 }
 
-TEST(Commands, DemoRunsFromAnywhere) {
+TEST(CliCommands, DemoRunsFromAnywhere) {
     REQUIRE_ICONV();
     Outcome demo = tool({}, "", {"TEXTCONV_SAMPLES=/nonexistent"}, "/");
     EXPECT_EQ(demo.status, 0) << demo.out << demo.err;
