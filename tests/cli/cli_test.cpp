@@ -391,6 +391,23 @@ TEST(CliConvertErrors, MissingConverterStopsOrContinues) {
               1);
 }
 
+// On a terminal the reference host asks; "n" stops with status 3, "y" goes on.
+TEST(CliConvertErrors, MissingConverterPromptOnATerminal) {
+    REQUIRE_ICONV();
+    if (!oracle("iconv -f UTF-8 -t UTF16-LE && echo yes", "a").empty())
+        GTEST_SKIP() << "this system has a UTF16-LE converter";
+    if (oracle("command -v script", "").empty()) GTEST_SKIP() << "no script program to make a terminal";
+    const std::string input = write_temp("prompt.txt", "ab\n");
+    for (const char *answer : {"n", "y"}) {
+        const std::string command = std::string("printf '") + answer + "\\n' | script -qec '" +
+                                    TEXTCONV_TOOL + " convert -f utf8 -t UTF16-LE " + input +
+                                    "; echo status=$?' /dev/null";
+        const std::string shown = oracle(command, "");
+        EXPECT_NE(shown.find("Continue without it?"), std::string::npos) << shown;
+        EXPECT_NE(shown.find(*answer == 'n' ? "status=3" : "status=0"), std::string::npos) << shown;
+    }
+}
+
 TEST(CliConvertProgress, ForcedBarReachesTheEndAndClears) {
     std::string text(300000, 'x');
     Outcome run = tool({"convert", "--progress", "-f", "latin1", "-t", "utf8", write_temp("big.txt", text)});
