@@ -108,16 +108,27 @@ TEXTCONV_API uint32_t FromEUCJPtoUTF8(const char *euc, char *utf8, uint8_t *coun
 TEXTCONV_API int StringFromEUCJPToUTF8(const char *euc, char *utf8, uint32_t *length) {
     const auto *in = reinterpret_cast<const uint8_t *>(euc);
     char *out = utf8;
+    bool warm = decoder_warm();
     while (*in != 0) {
-        if (*in < 0x80) {
-            *out++ = static_cast<char>(*in++);
+        const uint8_t b0 = *in;
+        if (b0 < 0x80) {
+            *out++ = static_cast<char>(b0);
+            ++in;
             continue;
+        }
+        if (warm && is_euc_byte(b0) && b0 != 0xAD && is_euc_byte(in[1])) {
+            if (const uint16_t unit = x0208Units[(b0 - 0xA1) * kCells + (in[1] - 0xA1)]) {
+                out += put_utf8(unit, out);
+                in += 2;
+                continue;
+            }
         }
         uint8_t count = 0;
         const uint32_t taken = eucjp_to_utf8(in, out, &count);
         if (taken == 0) return 0;
         in += taken;
         out += count;
+        warm = decoder_warm();
     }
     *out = 0;
     *length = static_cast<uint32_t>(out - utf8) + 1;
@@ -128,6 +139,7 @@ TEXTCONV_API int StringFromSJISToUTF8(const char *sjis, char *utf8, uint32_t *le
     const auto *in = reinterpret_cast<const uint8_t *>(sjis);
     char *out = utf8;
     *length = 1;
+    bool warm = decoder_warm();
     while (*in != 0) {
         if (*in >= 0x20 && *in <= 0x7E) {
             *out++ = static_cast<char>(*in++);
@@ -140,7 +152,7 @@ TEXTCONV_API int StringFromSJISToUTF8(const char *sjis, char *utf8, uint32_t *le
             *length = static_cast<uint32_t>(out - utf8) + 1;
             return 0;
         }
-        if (kind == MB_KIND_JISX0208 && jis.byte[0] != 13 && decoder_warm()) {
+        if (warm && kind == MB_KIND_JISX0208 && jis.byte[0] != 13) {
             const uint16_t unit = x0208Units[(jis.byte[0] - 1) * kCells + (jis.byte[1] - 1)];
             if (unit != 0) {
                 out += put_utf8(unit, out);
@@ -160,6 +172,7 @@ TEXTCONV_API int StringFromSJISToUTF8(const char *sjis, char *utf8, uint32_t *le
         eucjp_to_utf8(euc, out, &count);  // cannot fail: the bytes are well formed
         out += count;
         in += consumed;
+        warm = decoder_warm();
     }
     *out = 0;
     *length = static_cast<uint32_t>(out - utf8) + 1;
