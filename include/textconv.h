@@ -314,9 +314,10 @@ TEXTCONV_API int FromSJisToJis(const char *sjis, uint8_t *kind, JisCode *jis, ui
 TEXTCONV_API int FromJisToSJis(uint32_t kind, const JisCode *jis, char *sjis, uint8_t *length);
 
 /* NUL-terminated Shift-JIS to EUC-JP. *length in: capacity in bytes, the
- * terminator INCLUDED (at least 1); out: bytes written including it. Stops
- * early, at a character boundary, when room runs out (not an error). Returns
- * 1, or 0 when an invalid byte was replaced by a space. */
+ * terminator INCLUDED; out: bytes written including it (a capacity of 0
+ * writes nothing and leaves 0). Stops early, at a character boundary, when
+ * room runs out (not an error). Returns 1, or 0 when an invalid byte was
+ * replaced by a space. */
 TEXTCONV_API int StringFromSJISToEUCJP(const char *sjis, char *euc, uint32_t *length);
 
 /* When the local encoding is EUC-JP: *result receives a new EUC-JP copy of
@@ -356,8 +357,10 @@ TEXTCONV_API int FromUnicodeToMultiByte(uint16_t unit, uint32_t request, uint8_t
 TEXTCONV_API int FromUnicodeToEUCJP(uint16_t unit, char **cursor);
 
 /* One EUC-JP character to 1..3 UTF-8 bytes (room for 3); *count receives the
- * number. Returns the EUC-JP bytes taken (1..3), or 0 when no character can
- * start there. An unmappable character becomes U+FFFF. */
+ * number. Returns the EUC-JP bytes taken (1..3), or 0, writing nothing, when
+ * no character can start there: a byte that leads nothing, or a lead byte
+ * whose following bytes are cut short by the NUL or by an ASCII byte. An
+ * unmappable character becomes U+FFFF. */
 TEXTCONV_API uint32_t FromEUCJPtoUTF8(const char *euc, char *utf8, uint8_t *count);
 
 /* NUL-terminated EUC-JP to UTF-8. utf8 needs 3 * strlen / 2 + 1 bytes.
@@ -372,9 +375,10 @@ TEXTCONV_API int StringFromEUCJPToUTF8(const char *euc, char *utf8, uint32_t *le
 TEXTCONV_API int StringFromSJISToUTF8(const char *sjis, char *utf8, uint32_t *length);
 
 /* NUL-terminated EUC-JP to Shift-JIS. *length in: bytes that may be written
- * BEFORE the terminator (the buffer holds one more); out: bytes written
- * including the terminator. Returns 1, or 0 when a character was replaced by
- * a space. */
+ * BEFORE the terminator (the buffer holds one more; a negative value writes
+ * nothing and leaves 0); out: bytes written including the terminator.
+ * Returns 1, or 0 when a character was replaced by a space; a bad sequence
+ * becomes one space and never takes an ASCII byte with it. */
 TEXTCONV_API int StringFromEUCJPToSJIS(const char *euc, char *sjis, int32_t *length);
 
 /* ===================================================================== */
