@@ -11,6 +11,7 @@
 #include <string>
 #include <vector>
 
+#include "test_support.h"
 #include "textconv.h"
 
 namespace {
@@ -117,21 +118,35 @@ TEST(EucJpConverter, IconvCallsPerCharacter) {
     EXPECT_TRUE(prompts.empty());
 }
 
-// A real ja_JP EUC-JP locale through LOCPATH.
-TEST(StringToCurrentEncodingBuffer, ReleasedOrHandedOver) {
-    setenv("LC_ALL", "ja_JP.eucJP", 1);
+// StringToCurrentEncoding on an EUC-JP device (a real ja_JP EUC-JP locale
+// through LOCPATH): a new buffer holding glibc's conversion, or, for an
+// invalid byte or no memory, the input itself and no buffer left behind.
+TEST(StringToCurrentEncoding, EucJpDevice) {
+    setenv("LC_ALL", "ja_JP.eucJP", 1);  // glibc reports "EUC-JP"; the name says "eucJP"
+    ASSERT_EQ(LocalEncoding(), CHARSET_EUCJP);
     char *result = nullptr;
+    for (const char *sjis : {"", "A\xB1\x88\x9F", "\x82\xA0\xB6\xC5 ok"}) {
+        ASSERT_EQ(StringToCurrentEncoding(sjis, &result), 1);
+        EXPECT_NE(result, sjis);
+        EXPECT_EQ(std::string(result), *testsupport::iconv_convert("EUC-JP", "SJIS", sjis));
+        Mem_free(1, result);
+    }
     const char *bad = "\x82\xA0\t";
     EXPECT_EQ(StringToCurrentEncoding(bad, &result), 0);
     EXPECT_EQ(result, bad);
-    EXPECT_EQ(memAllocs, 1);
-    EXPECT_EQ(memFrees, 1);
     memoryExhausted = true;
-    EXPECT_EQ(StringToCurrentEncoding("\x82\xA0", &result), 0);
-    EXPECT_STREQ(result, "\x82\xA0");
-    memoryExhausted = false;
-    EXPECT_EQ(StringToCurrentEncoding("\x82\xA0", &result), 1);
-    EXPECT_STREQ(result, "\xA4\xA2");
-    Mem_free(1, result);
-    EXPECT_EQ(memAllocs, memFrees);
+    const char *good = "\x82\xA0";
+    EXPECT_EQ(StringToCurrentEncoding(good, &result), 0);
+    EXPECT_EQ(result, good);
+    EXPECT_EQ(memAllocs, 4);
+    EXPECT_EQ(memFrees, 4);
+}
+
+TEST(StringToCurrentEncoding, OtherDeviceHandsBackTheInput) {
+    setenv("LC_ALL", "ja_JP.SJIS", 1);
+    const char *sjis = "\x82\xA0";
+    char *same = nullptr;
+    EXPECT_EQ(StringToCurrentEncoding(sjis, &same), 0);
+    EXPECT_EQ(same, sjis);
+    EXPECT_EQ(memAllocs, 0);
 }
