@@ -266,9 +266,15 @@ const char *kind_name(unsigned kind) {
 }
 
 const char *kJisSyntax =
-    "CODE is one of: U+XXXX (a UTF-16 unit), 0xHHHH or sjis:HHHH (Shift-JIS bytes), eucjp:HHHH[HH] (EUC-JP "
-    "bytes), R-C or jis:R-C (JIS X 0208 row and cell, decimal), x0212:R-C (JIS X 0212), jis:HHHH (7-bit JIS "
-    "code), utf8:HH.. (UTF-8 bytes), or the character itself";
+    "CODE is one of:\n"
+    "  U+XXXX              a UTF-16 unit\n"
+    "  0xHHHH, sjis:HHHH   Shift-JIS bytes\n"
+    "  eucjp:HHHH[HH]      EUC-JP bytes\n"
+    "  R-C, jis:R-C        JIS X 0208 row and cell, in decimal (13-1)\n"
+    "  x0212:R-C           JIS X 0212 row and cell\n"
+    "  jis:HHHH            a 7-bit JIS code (2D21)\n"
+    "  utf8:HH...          UTF-8 bytes\n"
+    "  anything else       the character itself";
 
 }  // namespace
 
@@ -278,7 +284,7 @@ int run_jis(const std::string &code, const MissingConverterPolicy &policy) {
 
     const std::string lower = to_lower(code);
     auto bad = [&](const std::string &why) { return Failure(kExitBadInput, code + ": " + why); };
-    auto usage = [&]() { return Failure(kExitUsage, "cannot read '" + code + "'. " + kJisSyntax); };
+    auto usage = [&]() { return Failure(kExitUsage, "cannot read '" + code + "'.\n" + kJisSyntax); };
     auto prefixed = [&](const char *prefix) { return lower.rfind(prefix, 0) == 0; };
 
     uint16_t unit = 0xFFFF;

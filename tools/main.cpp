@@ -47,9 +47,12 @@ int main(int argc, char **argv) {
         "FROM and TO: an iconv name, id or alias from 'textconv list' (case does not matter), or 'local';\n"
         "FROM may also be cpN, text in server code page N (874 932 936 949 950 1250 1251 1252 1255 1256).\n"
         "Substitutes (?, U+FFFD, spaces, U+FFFF) are counted and reported on stderr.");
-    convertCmd->add_option("-f,--from", convert.from, "Charset of the input")->required();
-    convertCmd->add_option("-t,--to", convert.to, "Charset of the output")->required();
-    convertCmd->add_option("-o,--output", convert.output, "Write here instead of standard output");
+    convertCmd->add_option("-f,--from", convert.from, "Charset of the input")
+        ->required()
+        ->type_name("CHARSET");
+    convertCmd->add_option("-t,--to", convert.to, "Charset of the output")->required()->type_name("CHARSET");
+    convertCmd->add_option("-o,--output", convert.output, "Write here instead of standard output")
+        ->type_name("FILE");
     convertCmd->add_flag("--strict", convert.strict, "Make any substitution an error (exit status 1)");
     convertCmd->add_flag("-q,--quiet", convert.quiet, "Do not report the number of substitutions");
     convertCmd->add_flag_function(
@@ -60,7 +63,8 @@ int main(int argc, char **argv) {
         "--no-progress", [&](int64_t) { convert.progress = 0; }, "Never show the progress bar");
     convertCmd->add_option("--chunk-size", convert.chunkSize, "Bytes converted at a time (default 65536)")
         ->check(CLI::Range(size_t{16}, size_t{1} << 30));
-    convertCmd->add_option("FILE", convert.inputs, "Input files (default: standard input)");
+    convertCmd->add_option("FILE", convert.inputs, "Input files (default: standard input)")
+        ->type_name("FILE");
 
     auto *listCmd = app.add_subcommand("list", "List the registered charsets and this system's converters");
 
@@ -75,32 +79,34 @@ int main(int argc, char **argv) {
     escapeCmd->footer(
         "The output is in the same charset as the input; a literal % is doubled. Each line is\n"
         "escaped on its own.");
-    escapeCmd->add_option("-f,--from", escape.charset, "Charset of the text (default utf8)");
-    escapeCmd->add_option("-i,--input", escape.inputFile,
-                          "Read the text from this file ('-': standard input)");
-    escapeCmd->add_option("TEXT", escape.text, "The text");
+    escapeCmd->add_option("-f,--from", escape.charset, "Charset of the text (default utf8)")
+        ->type_name("CHARSET");
+    escapeCmd
+        ->add_option("-i,--input", escape.inputFile, "Read the text from this file ('-': standard input)")
+        ->type_name("FILE");
+    escapeCmd->add_option("TEXT", escape.text, "The text")->type_name("TEXT");
 
     EqualOptions equal;
     auto *equalCmd = app.add_subcommand("equal", "Tell whether two strings hold the same text (exit 0 or 1)");
     equalCmd->footer("ENC: utf8, local, or another charset (read into UTF-8 through the library first).");
     equalCmd->add_flag("-i,--ignore-case", equal.ignoreCase,
                        "Ignore the case of letters up to U+00FF, as the current locale folds them");
-    equalCmd->add_option("--first", equal.first, "Encoding of A (default utf8)");
-    equalCmd->add_option("--second", equal.second, "Encoding of B (default utf8)");
-    equalCmd->add_option("A", equal.a, "First string")->required();
-    equalCmd->add_option("B", equal.b, "Second string")->required();
+    equalCmd->add_option("--first", equal.first, "Encoding of A (default utf8)")->type_name("ENC");
+    equalCmd->add_option("--second", equal.second, "Encoding of B (default utf8)")->type_name("ENC");
+    equalCmd->add_option("A", equal.a, "First string")->required()->type_name("STRING");
+    equalCmd->add_option("B", equal.b, "Second string")->required()->type_name("STRING");
 
     std::string code;
     auto *jisCmd = app.add_subcommand("jis", "Show one Japanese character in every form");
     jisCmd->footer(
         std::string(jis_syntax()) +
-        ".\nExamples: textconv jis 0x8740; textconv jis 13-1; textconv jis U+2460; textconv jis eucjp:ADA1");
-    jisCmd->add_option("CODE", code, "The character")->required();
+        "\nExamples: textconv jis 0x8740; textconv jis 13-1; textconv jis U+2460; textconv jis eucjp:ADA1");
+    jisCmd->add_option("CODE", code, "The character")->required()->type_name("CODE");
 
     std::string samples;
     auto *demoCmd =
         app.add_subcommand("demo", "A short tour of the library over the bundled samples (the default)");
-    demoCmd->add_option("--samples", samples, "Folder of the sample texts");
+    demoCmd->add_option("--samples", samples, "Folder of the sample texts")->type_name("DIR");
 
     try {
         app.parse(argc, argv);
