@@ -170,7 +170,22 @@ const char *charset_name(CharsetId id) {
 std::vector<std::string> charset_aliases(CharsetId id) {
     std::vector<std::string> out;
     if (id <= CHARSET_NONE || id >= CHARSET_COUNT) return out;
-    for (const char *alias : kNames[id].aliases) out.emplace_back(alias);
+    std::vector<std::string> seen{normalise(charset_name(id))};
+    // The platform codeset names the library's table knows, unless they only
+    // differ from a name above in case or punctuation.
+    auto add = [&](const char *alias) {
+        const std::string key = normalise(alias);
+        for (const std::string &s : seen)
+            if (s == key) return;
+        seen.push_back(key);
+        out.emplace_back(alias);
+    };
+    for (const char *alias : kNames[id].aliases) {
+        seen.push_back(normalise(alias));
+        out.emplace_back(alias);
+    }
+    for (const StringIDEntry *row = charsets; row->name; ++row)
+        if (row->id == id) add(row->name);
     return out;
 }
 

@@ -46,7 +46,7 @@ int run_list() {
     std::printf(
         "\n\n\"to UTF-16\" and \"from UTF-16\" tell whether this system's iconv opens the converters the\n"
         "library uses; a charset without them stops 'convert' with exit status 3 (see --continue).\n"
-        "\"local\" names the local encoding, here %s.\n",
+        "\"local\" names the local encoding, here %s. Case, '-', '_' and '.' do not matter in names.\n",
         describe(LocalEncoding()).c_str());
     return kExitDone;
 }
