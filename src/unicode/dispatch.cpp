@@ -24,12 +24,18 @@ constexpr Paths kSse2 = {"sse2", fast::utf8_to_utf16_sse2, fast::utf16_to_utf8_s
 constexpr Paths kAvx2 = {"avx2", fast::utf8_to_utf16_avx2, fast::utf16_to_utf8_avx2,
                          fast::latin1_to_utf8_avx2};
 #endif
+#if defined(__arm__) && defined(__ARM_PCS_VFP)
+constexpr Paths kNeon = {"neon", fast::utf8_to_utf16_neon, fast::utf16_to_utf8_neon,
+                         fast::latin1_to_utf8_neon};
+#endif
 
 const Paths *choose() {
     const char *force = std::getenv("TEXTCONV_FORCE_SCALAR");
     if (force != nullptr && std::strcmp(force, "1") == 0) return &kScalar;
 #if defined(__x86_64__)
     return fast::avx2_available() ? &kAvx2 : &kSse2;
+#elif defined(__arm__) && defined(__ARM_PCS_VFP)
+    return fast::neon_available() ? &kNeon : &kWords;
 #else
     return &kWords;
 #endif

@@ -22,7 +22,7 @@ uint32_t latin1_to_utf8_scalar(const uint8_t *src, uint32_t len, uint8_t *dst);
 uint32_t latin1_to_utf8(const uint8_t *src, uint32_t len, uint8_t *dst);
 
 // Which implementation the dispatched functions use: "scalar", "words",
-// "sse2" or "avx2". Chosen once, at the first call; TEXTCONV_FORCE_SCALAR=1 in the
+// "neon", "sse2" or "avx2". Chosen once, at the first call; TEXTCONV_FORCE_SCALAR=1 in the
 // environment forces the scalar code.
 const char *active_path();
 
@@ -42,6 +42,13 @@ uint32_t latin1_to_utf8_sse2(const uint8_t *src, uint32_t len, uint8_t *dst);
 uint32_t utf8_to_utf16_avx2(const uint8_t *src, uint32_t len, uint16_t *dst, uint32_t cap, uint32_t *written);
 uint32_t utf16_to_utf8_avx2(const uint16_t *src, uint32_t len, uint8_t *dst, uint32_t cap, uint32_t *written);
 uint32_t latin1_to_utf8_avx2(const uint8_t *src, uint32_t len, uint8_t *dst);
+#endif
+#if defined(__arm__) && defined(__ARM_PCS_VFP)
+bool neon_available();
+// Call only when neon_available().
+uint32_t utf8_to_utf16_neon(const uint8_t *src, uint32_t len, uint16_t *dst, uint32_t cap, uint32_t *written);
+uint32_t utf16_to_utf8_neon(const uint16_t *src, uint32_t len, uint8_t *dst, uint32_t cap, uint32_t *written);
+uint32_t latin1_to_utf8_neon(const uint8_t *src, uint32_t len, uint8_t *dst);
 #endif
 }  // namespace fast
 

@@ -36,6 +36,10 @@ std::vector<Path> paths() {
     p.push_back({"sse2", utf8_to_utf16_sse2, utf16_to_utf8_sse2, latin1_to_utf8_sse2});
     if (avx2_available()) p.push_back({"avx2", utf8_to_utf16_avx2, utf16_to_utf8_avx2, latin1_to_utf8_avx2});
 #endif
+#if defined(__arm__) && defined(__ARM_PCS_VFP)
+    using namespace textconv::fast;
+    if (neon_available()) p.push_back({"neon", utf8_to_utf16_neon, utf16_to_utf8_neon, latin1_to_utf8_neon});
+#endif
     return p;
 }
 
@@ -93,10 +97,16 @@ void compare_utf8_to_utf16(const Path &path, const std::string &in, uint32_t cap
     const size_t units = cap / 2 + 40;
     std::vector<uint16_t> want(units, 0xA5A5), got(units, 0xA5A5);
     uint32_t wantWritten = 0xDEAD, gotWritten = 0xDEAD;
-    const auto *src = reinterpret_cast<const uint8_t *>(in.data());
+    // Input and a second target of exactly the given sizes, so that a
+    // sanitizer sees any access past them.
+    const std::vector<uint8_t> exactIn(in.begin(), in.end());
+    std::vector<uint16_t> exactOut((cap + 1) / 2);
+    const uint8_t *src = exactIn.data();
     const auto len = static_cast<uint32_t>(in.size());
     uint32_t wantResult = textconv::utf8_to_utf16_scalar(src, len, want.data(), cap, &wantWritten);
     uint32_t gotResult = path.utf8_to_utf16(src, len, got.data(), cap, &gotWritten);
+    uint32_t unused;
+    EXPECT_EQ(path.utf8_to_utf16(src, len, exactOut.data(), cap, &unused), wantResult);
     ASSERT_EQ(gotResult, wantResult) << path.name << " cap " << cap << " "
                                      << testsupport::hex(in.substr(0, 64));
     ASSERT_EQ(gotWritten, wantWritten) << path.name << " cap " << cap;
@@ -107,10 +117,14 @@ void compare_utf8_to_utf16(const Path &path, const std::string &in, uint32_t cap
 void compare_utf16_to_utf8(const Path &path, const std::u16string &in, uint32_t cap) {
     std::vector<uint8_t> want(cap + 64, 0xA5), got(cap + 64, 0xA5);
     uint32_t wantWritten = 0xDEAD, gotWritten = 0xDEAD;
-    const auto *src = reinterpret_cast<const uint16_t *>(in.data());
+    const std::vector<uint16_t> exactIn(in.begin(), in.end());
+    std::vector<uint8_t> exactOut(cap);
+    const uint16_t *src = exactIn.data();
     const auto len = static_cast<uint32_t>(in.size() * 2);
     uint32_t wantResult = textconv::utf16_to_utf8_scalar(src, len, want.data(), cap, &wantWritten);
     uint32_t gotResult = path.utf16_to_utf8(src, len, got.data(), cap, &gotWritten);
+    uint32_t unused;
+    EXPECT_EQ(path.utf16_to_utf8(src, len, exactOut.data(), cap, &unused), wantResult);
     ASSERT_EQ(gotResult, wantResult) << path.name << " cap " << cap;
     ASSERT_EQ(gotWritten, wantWritten) << path.name << " cap " << cap;
     ASSERT_TRUE(want == got) << path.name << " target differs, cap " << cap;
@@ -221,10 +235,13 @@ TEST(FastPaths, Latin1MatchesScalar) {
         for (const auto &s : inputs) {
             // Exactly the room the contract asks for, then a guard.
             std::vector<uint8_t> want(2 * s.size() + 1 + 32, 0xA5), got(want);
-            const auto *src = reinterpret_cast<const uint8_t *>(s.data());
+            const std::vector<uint8_t> exactIn(s.begin(), s.end());
+            std::vector<uint8_t> exactOut(2 * s.size());
+            const uint8_t *src = exactIn.data();
             const auto len = static_cast<uint32_t>(s.size());
             ASSERT_EQ(path.latin1_to_utf8(src, len, got.data()),
                       textconv::latin1_to_utf8_scalar(src, len, want.data()));
+            path.latin1_to_utf8(src, len, exactOut.data());
             ASSERT_TRUE(want == got) << path.name << " " << s.size();
         }
     }
@@ -243,6 +260,8 @@ TEST(FastPaths, FastestAvailablePathIsChosen) {
     unsetenv("TEXTCONV_FORCE_SCALAR");
 #if defined(__x86_64__)
     EXPECT_STREQ(textconv::active_path(), textconv::fast::avx2_available() ? "avx2" : "sse2");
+#elif defined(__arm__) && defined(__ARM_PCS_VFP)
+    EXPECT_STREQ(textconv::active_path(), textconv::fast::neon_available() ? "neon" : "words");
 #else
     EXPECT_STREQ(textconv::active_path(), "words");
 #endif
