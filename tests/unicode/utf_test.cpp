@@ -286,21 +286,6 @@ TEST(StringFromUTF8ToUnicode, SequenceCutShortByTheTerminatorFails) {
                                                                                                   4)));
 }
 
-TEST(StringFromUTF8ToUnicode, CorpusAtEveryCapacityNearTheEnd) {
-    auto text = testsupport::read_corpus("japanese.utf8.txt");
-    if (!text) GTEST_SKIP() << "corpora not available";
-    std::u16string want = *testsupport::iconv_to_utf16("UTF-8", *text) + u'\0';
-    std::vector<uint16_t> out(want.size() + 4);
-    const uint32_t need = static_cast<uint32_t>(want.size() * 2);
-    for (uint32_t cap = need - 8; cap <= need + 2; ++cap) {
-        uint32_t len = cap;
-        int ok = StringFromUTF8ToUnicode(text->c_str(), out.data(), &len);
-        EXPECT_EQ(ok, cap >= need) << cap;
-        EXPECT_EQ(len, cap >= need ? need : 0u);
-    }
-    EXPECT_EQ(std::memcmp(out.data(), want.data(), need), 0);
-}
-
 TEST(StringFromUnicodeToUTF8, TerminatorAndCapacity) {
     const uint16_t in[] = {0x41, 0xE9, 0x20AC, 0xD83D, 0xDE00, 0};
     const std::string want("A\xC3\xA9\xE2\x82\xAC\xF0\x9F\x98\x80\0", 11);
@@ -353,36 +338,6 @@ TEST(FromUTF8ToUnicode, OneCharacterTable) {
         EXPECT_EQ(hex(std::u16string(out, out + n)), hex(c.out)) << hex(c.in);
         EXPECT_EQ(out[2], kSentinel);
         EXPECT_EQ(written, c.ok ? c.out.size() * 2 : 99u) << hex(c.in);
-    }
-}
-
-TEST(FromUTF8ToUnicode, WalkingARandomTextMatchesTheStringDecoder) {
-    for (uint32_t seed = 1; seed <= 50; ++seed) {
-        std::string s = testsupport::random_utf8(seed, 200);
-        // Damage some bytes so illegal sequences are walked too.
-        for (size_t i = seed; i < s.size(); i += 37)
-            s[i] = static_cast<char>(s[i] ^ (seed % 2 ? 0x40 : 0x80));
-        for (size_t i = 0; i < s.size(); ++i)
-            if (s[i] == '\0') s[i] = ' ';
-        std::u16string walked;
-        const char *cursor = s.c_str();
-        while (*cursor) {
-            uint16_t out[2];
-            uint32_t written = 0;
-            const char *before = cursor;
-            if (FromUTF8ToUnicode(&cursor, out, &written)) {
-                walked.append(reinterpret_cast<char16_t *>(out), written / 2);
-            } else {
-                walked.append(u"!");  // an illegal sequence of 3 or more bytes
-                ASSERT_GT(cursor, before);
-            }
-            ASSERT_LE(cursor, s.c_str() + s.size());
-        }
-        std::u16string whole = decode(s).units;
-        // Both agree wherever the walker did not hit its 2-unit limit.
-        if (walked.find(u'!') == std::u16string::npos) {
-            EXPECT_EQ(hex(walked), hex(whole)) << seed;
-        }
     }
 }
 
