@@ -1,7 +1,78 @@
 // Text in the local encoding to and from UTF-16 and UTF-8.
 #include <cstring>
 
+#include "frame/registry.h"
 #include "textconv.h"
+
+namespace {
+
+// Charsets of one byte per character.
+constexpr bool is_single_byte(CharsetId charset) {
+    switch (charset) {
+        case CHARSET_LATIN1:
+        case CHARSET_KOI8R:
+        case CHARSET_ISO8859_11:
+        case CHARSET_ISO8859_6:
+        case CHARSET_ISO8859_8:
+        case CHARSET_ISO8859_2:
+        case CHARSET_ISO8859_15:
+        case CHARSET_CP1250:
+        case CHARSET_CP1251:
+        case CHARSET_CP1256:
+            return true;
+        default:
+            return false;
+    }
+}
+
+// What the converter made of the units of a single-byte charset, kept so that
+// text seen again needs no iconv call. A unit is recorded only once the
+// charset's converter is open: until then, and for ever when it cannot be
+// opened, every unit goes to the converter as before (with its question and
+// messages). Direct-mapped; a unit that finds its slot taken asks again.
+struct UnitByteCache {
+    struct Entry {
+        uint16_t unit;
+        uint8_t byte;
+        uint8_t state;  // 0 nothing known, 1 byte holds the unit, 2 no byte does
+    };
+    static constexpr unsigned kSlots = 1024;
+    CharsetId charset;  // whose units the entries hold
+    Entry entries[kSlots];
+};
+UnitByteCache unitCache;
+
+inline unsigned slot_of(uint16_t unit) { return ((unit * 40503u) >> 6) & (UnitByteCache::kSlots - 1); }
+
+bool converter_open(CharsetId charset) {
+    const textconv::ConverterCell cell = textconv::fromUnicodeConverters[charset];
+    return cell != textconv::unopened_cell() && cell != textconv::failed_cell();
+}
+
+// FromUnicodeToCharset, through the cache for a single-byte charset.
+int unit_to_charset(CharsetId charset, uint32_t unit, char **cursor) {
+    if (!is_single_byte(charset)) return FromUnicodeToCharset(charset, unit, cursor);
+    if (unitCache.charset != charset) {
+        std::memset(unitCache.entries, 0, sizeof unitCache.entries);
+        unitCache.charset = charset;
+    }
+    const auto u = static_cast<uint16_t>(unit);
+    UnitByteCache::Entry &e = unitCache.entries[slot_of(u)];
+    if (e.state != 0 && e.unit == u) {
+        if (e.state == 2) return 0;
+        *(*cursor)++ = static_cast<char>(e.byte);
+        return 1;
+    }
+    char *start = *cursor;
+    const int result = FromUnicodeToCharset(charset, unit, cursor);
+    if (converter_open(charset)) {
+        if (result && *cursor - start == 1) e = {u, static_cast<uint8_t>(*start), 1};
+        if (!result) e = {u, 0, 2};
+    }
+    return result;
+}
+
+}  // namespace
 
 extern "C" {
 
@@ -18,7 +89,7 @@ TEXTCONV_API int StringFromLocalToUnicode(const char *source, uint16_t *target, 
 }
 
 TEXTCONV_API int FromUnicodeToLocal(uint32_t unit, char **cursor) {
-    return FromUnicodeToCharset(LocalEncoding(), unit, cursor);
+    return unit_to_charset(LocalEncoding(), unit, cursor);
 }
 
 TEXTCONV_API int FromLocalToUnicode(const char **cursor, uint16_t *target, uint32_t *count) {
@@ -50,7 +121,7 @@ TEXTCONV_API int StringFromUTF8ToLocal(const char *source, char *target, uint32_
     char *out = target;
     for (uint32_t i = 0, count = decoded / 2; i < count && units[i] != 0; ++i) {
         // A surrogate pair goes over as two separate units.
-        if (!FromUnicodeToCharset(local, units[i], &out)) {
+        if (!unit_to_charset(local, units[i], &out)) {
             *out++ = '?';
             result = 0;
         }

@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 #include <iconv.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <cstring>
 #include <set>
@@ -46,6 +47,15 @@ int32_t GetiStringID(const char *key, const StringIDEntry *table) {
     return table->id;
 }
 void *memmove_soc(void *d, const void *s, uint32_t n) { return std::memmove(d, s, n); }
+
+// Every conversion call, counted.
+int iconvCalls = 0;
+size_t iconv(iconv_t cd, char **in, size_t *inLeft, char **out, size_t *outLeft) {
+    using Fn = size_t (*)(iconv_t, char **, size_t *, char **, size_t *);
+    static Fn real = reinterpret_cast<Fn>(dlsym(RTLD_NEXT, "iconv"));
+    ++iconvCalls;
+    return real(cd, in, inLeft, out, outLeft);
+}
 
 // With convertersMissing, the platform has no converter for the local charset.
 iconv_t iconv_open(const char *to, const char *from) {
@@ -203,6 +213,46 @@ TEST(LocalHost, ConvertersMissing) {
     EXPECT_EQ(length, 2u);
     EXPECT_EQ(prompts, 2);  // once per direction
     EXPECT_TRUE(liveBlocks.empty());
+}
+
+// Units of a single-byte local charset are asked of the converter once; the
+// converter is opened, and a missing one reported, exactly as unit by unit.
+TEST(LocalHost, SingleByteUnitsAreAskedOnce) {
+    const char *text =
+        "shalom \xD7\xA9\xD7\x9C\xD7\x95\xD7\x9D \xE2\x82\xAC!";  // a euro sign ISO-8859-8 lacks
+    const std::string expected = "shalom \xF9\xEC\xE5\xED ?!";
+    char target[64];
+    uint32_t length = 0;
+    EXPECT_EQ(StringFromUTF8ToLocal(text, target, &length), 0);
+    EXPECT_EQ(std::string(target, length - 1), expected);
+    const int distinct = 13;  // s h a l o m space, four letters, euro, !
+    EXPECT_EQ(iconvCalls, distinct);
+    iconvCalls = 0;
+    for (int i = 0; i < 3; ++i) {
+        EXPECT_EQ(StringFromUTF8ToLocal(text, target, &length), 0);
+        EXPECT_EQ(std::string(target, length - 1), expected);
+    }
+    char *cursor = target;
+    EXPECT_EQ(FromUnicodeToLocal(0x05E9, &cursor), 1);
+    EXPECT_EQ(FromUnicodeToLocal(0x20AC, &cursor), 0);
+    EXPECT_EQ(cursor, target + 1);
+    EXPECT_EQ(target[0], '\xF9');
+    EXPECT_EQ(iconvCalls, 0);
+}
+
+TEST(LocalHost, SingleByteUnitsWithoutConverterAreAskedEveryTime) {
+    convertersMissing = true;
+    testing::internal::CaptureStderr();
+    char target[16];
+    uint32_t length = 0;
+    for (int i = 0; i < 2; ++i) {
+        EXPECT_EQ(StringFromUTF8ToLocal("ab", target, &length), 0);
+        EXPECT_STREQ(target, "??");
+    }
+    std::string messages = testing::internal::GetCapturedStderr();
+    EXPECT_EQ(prompts, 1);
+    EXPECT_EQ(std::count(messages.begin(), messages.end(), '\n'), 4) << messages;
+    EXPECT_NE(messages.find("Cannot use iconv to convert from UTF-16 to ISO-8859-8 (97)"), std::string::npos);
 }
 
 }  // namespace
