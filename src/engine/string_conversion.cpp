@@ -183,8 +183,10 @@ int string_from_charset_to_unicode(CharsetId charset, const char **source, uint1
         // room for the terminator in a buffer sized for the text alone. Run
         // the pass once more (a converter that marks only its first output
         // then fits); if the mark comes again, keep the terminator out of
-        // the converter from now on and store it here.
-        if (error == E2BIG && !withheld && written >= 2 && unit_at(passOutput, 0) == kByteOrderMark) {
+        // the converter from now on and store it here. A UTF-8 source's own
+        // mark is text and proves nothing about the converter.
+        if (error == E2BIG && !withheld &&
+            starts_with_converter_mark(charset, passSource, passOutput, written)) {
             if (retries == 0) {
                 retries = 1;
             } else {

@@ -46,6 +46,17 @@ TEST(EngineMarks, GlibcMarkOnFirstOutputIsRetriedOnce) {
     EXPECT_EQ(calls_to(to_unicode_cd(CHARSET_UTF8), before), 1u);
 }
 
+TEST(EngineMarks, SourceMarkInAFullBufferIsNoConverterMark) {
+    ASSERT_EQ(to_unicode(CHARSET_UTF8, "a").result, 1);  // glibc's one mark
+    Outcome full = to_unicode(CHARSET_UTF8,
+                              "\xEF\xBB\xBF"
+                              "abc",
+                              4);
+    EXPECT_EQ(full.result, 0);
+    EXPECT_EQ(full.length, 4u);
+    EXPECT_EQ(terminatorOutsideConverter, 0u);
+}
+
 TEST(EngineMarks, SecondMarkSetsTheFlagAndTheTerminatorIsStoredHere) {
     shim::markEveryCall = true;
     Outcome run = to_unicode(CHARSET_UTF8, kText, 12);
