@@ -221,6 +221,31 @@ TEST_P(CliConvertMatchesIconv, ByteForByte) {
 INSTANTIATE_TEST_SUITE_P(Texts, CliConvertMatchesIconv, testing::ValuesIn(kDifferentials),
                          [](const testing::TestParamInfo<Differential> &info) { return info.param.name; });
 
+// A line far longer than a chunk is cut between characters, whatever their
+// length in the charset, both when it is read and when it is written.
+TEST(CliConvertChunks, LongLinesCutBetweenCharacters) {
+    REQUIRE_ICONV();
+    std::string text;
+    for (int i = 0; i < 40; ++i)
+        text +=
+            "\xE6\x9D\xB1\xE4\xBA\xAC"
+            "a\xE5\xA4\xA7\xE5\xAD\xB8"
+            "1 \xE4\xB8\xAD\xE5\x9C\x8B";
+    for (const char *charset :
+         {"SJIS", "EUC-JP", "GB18030", "GBK", "BIG5", "BIG5HKSCS", "EUC-KR", "UTF-16", "UTF-8"}) {
+        const std::string encoded = oracle(std::string("iconv -f UTF-8 -t ") + charset, text);
+        ASSERT_FALSE(encoded.empty()) << charset;
+        for (const char *chunk : {"16", "17", "23"}) {
+            EXPECT_EQ(tool({"convert", "--chunk-size", chunk, "-f", charset, "-t", "utf8"}, encoded).out,
+                      text)
+                << charset << " read in chunks of " << chunk;
+            EXPECT_EQ(tool({"convert", "--chunk-size", chunk, "-f", "utf8", "-t", charset}, text).out,
+                      encoded)
+                << charset << " written in chunks of " << chunk;
+        }
+    }
+}
+
 // Every KOI8-R byte, both ways.
 TEST(CliConvertExhaustive, EveryKoi8rByte) {
     REQUIRE_ICONV();
