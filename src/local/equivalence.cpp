@@ -20,26 +20,74 @@ bool decode(Decoder decoder, const char *&cursor, uint16_t unit[2], uint32_t &co
     return cursor > start && !std::memchr(start, 0, static_cast<size_t>(cursor - start));
 }
 
-// The length of the well-formed UTF-8 sequence at p (1 to 4), or 0. Such a
-// sequence always decodes to its code point, so two equal ones are
-// equivalent without decoding.
-inline unsigned wellformed_length(const unsigned char *p) {
-    const unsigned char lead = p[0];
-    auto trail = [p](int i, unsigned char lo = 0x80, unsigned char hi = 0xBF) {
-        return p[i] >= lo && p[i] <= hi;
-    };
-    if (lead < 0x80) return 1;
-    if (lead < 0xC2) return 0;
-    if (lead < 0xE0) return trail(1) ? 2 : 0;
-    if (lead < 0xF0) {
-        const bool second = lead == 0xE0 ? trail(1, 0xA0) : lead == 0xED ? trail(1, 0x80, 0x9F) : trail(1);
-        return second && trail(2) ? 3 : 0;
+// The number of leading bytes that a and b share among their first n, both
+// readable that far. Eight bytes at a time while they agree.
+size_t common_prefix(const char *a, const char *b, size_t n) {
+    size_t p = 0;
+    for (; p + 8 <= n; p += 8) {
+        uint64_t x;
+        uint64_t y;
+        std::memcpy(&x, a + p, 8);
+        std::memcpy(&y, b + p, 8);
+        if (x != y) break;
     }
-    if (lead < 0xF5) {
-        const bool second = lead == 0xF0 ? trail(1, 0x90) : lead == 0xF4 ? trail(1, 0x80, 0x8F) : trail(1);
-        return second && trail(2) && trail(3) ? 4 : 0;
+    while (p < n && a[p] == b[p]) ++p;
+    return p;
+}
+
+// The length of the longest run of whole well-formed UTF-8 sequences at the
+// start of the n bytes at s. ASCII eight bytes at a time, the other forms by
+// their lead byte, without reading past the n bytes.
+size_t wellformed_prefix(const unsigned char *s, size_t n) {
+    size_t q = 0;
+    while (q < n) {
+        const unsigned char c = s[q];
+        if (c < 0x80) {
+            ++q;
+            if (q < n && s[q] < 0x80) {
+                while (q + 8 <= n) {
+                    uint64_t x;
+                    std::memcpy(&x, s + q, 8);
+                    if (x & 0x8080808080808080u) break;
+                    q += 8;
+                }
+            }
+            continue;
+        }
+        if (c < 0xC2) break;
+        if (c < 0xE0) {
+            // Runs of two-byte letters (Cyrillic, Greek, Hebrew, Arabic).
+            do {
+                if (q + 2 > n || (s[q + 1] & 0xC0) != 0x80) return q;
+                q += 2;
+            } while (q < n && s[q] >= 0xC2 && s[q] < 0xE0);
+            continue;
+        }
+        if (c < 0xF0) {
+            // Runs of three-byte characters (CJK, most other scripts).
+            do {
+                if (q + 3 > n) return q;
+                const unsigned char lead = s[q];
+                const unsigned char t = s[q + 1];
+                if (((t | (s[q + 2] << 8)) & 0xC0C0) != 0x8080) return q;
+                // No overlong form (E0 80..9F) and no surrogate (ED A0..BF).
+                if ((lead == 0xE0 && t < 0xA0) || (lead == 0xED && t > 0x9F)) return q;
+                q += 3;
+            } while (q < n && (s[q] & 0xF0) == 0xE0);
+            continue;
+        }
+        if (c < 0xF5) {
+            if (q + 4 > n) break;
+            const unsigned char t = s[q + 1];
+            const unsigned char lo = c == 0xF0 ? 0x90 : 0x80;
+            const unsigned char hi = c == 0xF4 ? 0x8F : 0xBF;
+            if (t < lo || t > hi || (s[q + 2] & 0xC0) != 0x80 || (s[q + 3] & 0xC0) != 0x80) break;
+            q += 4;
+            continue;
+        }
+        break;
     }
-    return 0;
+    return q;
 }
 
 }  // namespace
@@ -54,23 +102,21 @@ TEXTCONV_API int StringsEquivalent(const char *first, int32_t firstEncoding, con
     const bool bothUtf8 = firstEncoding == CHARSET_UTF8 && secondEncoding == CHARSET_UTF8;
     const char *a = first;
     const char *b = second;
+    // Both in UTF-8: the string ends are known, so equal runs can be found
+    // and checked a word at a time without reading past either terminator.
+    const char *const firstEnd = bothUtf8 ? first + std::strlen(first) : nullptr;
+    const char *const secondEnd = bothUtf8 ? second + std::strlen(second) : nullptr;
     for (;;) {
         if (bothUtf8) {
-            // Equal well-formed sequences are equal characters: skip them.
-            const auto *pa = reinterpret_cast<const unsigned char *>(a);
-            const auto *pb = reinterpret_cast<const unsigned char *>(b);
-            while (*pa == *pb && *pa) {
-                const unsigned n = wellformed_length(pa);
-                // Byte by byte: the second string may end inside the sequence.
-                unsigned same = 1;
-                while (same < n && pa[same] == pb[same]) ++same;
-                if (n == 0 || same != n) break;
-                pa += n;
-                pb += n;
-            }
-            if (*pa == 0 && *pb == 0) return 1;
-            a = reinterpret_cast<const char *>(pa);
-            b = reinterpret_cast<const char *>(pb);
+            const size_t ra = static_cast<size_t>(firstEnd - a);
+            const size_t rb = static_cast<size_t>(secondEnd - b);
+            const size_t shorter = ra < rb ? ra : rb;
+            const size_t same = common_prefix(a, b, shorter + 1);  // the shorter string's NUL included
+            const size_t skip = wellformed_prefix(reinterpret_cast<const unsigned char *>(a),
+                                                  same < shorter ? same : shorter);
+            if (skip == shorter && same == shorter + 1) return 1;  // equal and well-formed to both ends
+            a += skip;
+            b += skip;
         }
 
         uint16_t ua[2];

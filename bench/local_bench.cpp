@@ -1,0 +1,110 @@
+// The local layer on real text: StringsEquivalent on two equal UTF-8 strings
+// against ICU turning one of them into UTF-16, and StringFromUTF8ToLocal into
+// the process's local charset (Latin-1 unless LANG names another) against
+// glibc iconv. Throughput counts the bytes of one UTF-8 input.
+#include <iconv.h>
+#include <unicode/ustring.h>
+
+#include <cstring>
+#include <string>
+#include <vector>
+
+#include "bench_support.h"
+#include "textconv.h"
+
+namespace {
+
+using benchsupport::register_per_corpus;
+
+void equivalent_textconv(benchmark::State &state, const std::string &text) {
+    const std::string copy = text;  // a second buffer: no shortcut on equal pointers
+    for (auto _ : state) {
+        int r = StringsEquivalent(text.c_str(), CHARSET_UTF8, copy.c_str(), CHARSET_UTF8, 0);
+        if (r != 1) state.SkipWithError("not equivalent");
+        benchmark::DoNotOptimize(r);
+    }
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
+void equivalent_icu(benchmark::State &state, const std::string &text) {
+    std::vector<UChar> out(text.size() + 8);
+    for (auto _ : state) {
+        int32_t n = 0;
+        UErrorCode err = U_ZERO_ERROR;
+        u_strFromUTF8(out.data(), static_cast<int32_t>(out.size()), &n, text.data(),
+                      static_cast<int32_t>(text.size()), &err);
+        if (U_FAILURE(err)) state.SkipWithError("ICU failed");
+        benchmark::DoNotOptimize(n);
+        benchmark::ClobberMemory();
+    }
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
+// The text cut down to what the local charset holds (glibc drops the rest),
+// back in UTF-8: input that both sides convert without substitutes.
+std::string fitting_utf8(const std::string &text) {
+    const char *charset = charsetConversion[LocalEncoding()].iconvName;
+    std::string local(text.size() + 16, '\0');
+    std::string back(text.size() * 4 + 16, '\0');
+    iconv_t in = iconv_open((std::string(charset) + "//IGNORE").c_str(), "UTF-8");
+    iconv_t out = iconv_open("UTF-8", charset);
+    if (in == reinterpret_cast<iconv_t>(-1) || out == reinterpret_cast<iconv_t>(-1)) return "";
+    char *ip = const_cast<char *>(text.data());
+    size_t il = text.size();
+    char *op = local.data();
+    size_t ol = local.size();
+    iconv(in, &ip, &il, &op, &ol);  // -1 with EILSEQ after dropping characters
+    local.resize(local.size() - ol);
+    ip = local.data();
+    il = local.size();
+    op = back.data();
+    ol = back.size();
+    iconv(out, &ip, &il, &op, &ol);
+    back.resize(back.size() - ol);
+    iconv_close(in);
+    iconv_close(out);
+    return back;
+}
+
+void utf8_to_local_textconv(benchmark::State &state, const std::string &corpus) {
+    const std::string text = fitting_utf8(corpus);
+    std::vector<char> out(4 * text.size() + 8);
+    for (auto _ : state) {
+        uint32_t length = 0;
+        int r = StringFromUTF8ToLocal(text.c_str(), out.data(), &length);
+        if (r != 1) state.SkipWithError("a character did not convert");
+        benchmark::DoNotOptimize(length);
+        benchmark::ClobberMemory();
+    }
+    state.SetLabel(charsetConversion[LocalEncoding()].iconvName);
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
+void utf8_to_local_iconv(benchmark::State &state, const std::string &corpus) {
+    const std::string text = fitting_utf8(corpus);
+    iconv_t cd = iconv_open(charsetConversion[LocalEncoding()].iconvName, "UTF-8");
+    std::vector<char> out(4 * text.size() + 8);
+    for (auto _ : state) {
+        iconv(cd, nullptr, nullptr, nullptr, nullptr);
+        char *ip = const_cast<char *>(text.data());
+        size_t il = text.size();
+        char *op = out.data();
+        size_t ol = out.size();
+        if (iconv(cd, &ip, &il, &op, &ol) == static_cast<size_t>(-1)) state.SkipWithError("iconv failed");
+        benchmark::DoNotOptimize(op);
+        benchmark::ClobberMemory();
+    }
+    iconv_close(cd);
+    state.SetLabel(charsetConversion[LocalEncoding()].iconvName);
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
+[[maybe_unused]] const bool registered = [] {
+    register_per_corpus("Equivalent/textconv", ".utf8.txt", equivalent_textconv);
+    register_per_corpus("Equivalent/icu", ".utf8.txt", equivalent_icu);
+    register_per_corpus("UTF8toLocal/textconv", ".utf8.txt", utf8_to_local_textconv);
+    register_per_corpus("UTF8toLocal/iconv", ".utf8.txt", utf8_to_local_iconv);
+    return true;
+}();
+
+}  // namespace
