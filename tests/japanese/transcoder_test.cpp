@@ -18,22 +18,23 @@ struct Result {
     int64_t length;
 };
 
-Result eucjp_to_utf8(const std::string &euc) {
-    jptest::Guarded in(euc);
-    std::string out(euc.size() * 3 / 2 + 1, '\0');
+// The UTF-8 transcoders take no room: the output buffer is exactly the size
+// their contract asks for, and the guard bytes after it must stay.
+template <typename Transcoder>
+Result to_utf8(Transcoder transcoder, const std::string &in, size_t size) {
+    jptest::Guarded source(in);
+    std::string out(size + 8, '\x01');
     uint32_t length = 0xDEAD;
-    const int ok = StringFromEUCJPToUTF8(in.c_str(), out.data(), &length);
-    if (ok) out.resize(length - 1);
-    return {ok, ok ? out : out.substr(0, out.find('\0')), length};
+    const int ok = transcoder(source.c_str(), out.data(), &length);
+    if (out.compare(size, 8, std::string(8, '\x01')) != 0)
+        ADD_FAILURE() << "wrote past " << size << ": " << hex(in);
+    return {ok, out.substr(0, ok ? length - 1 : out.find('\x01')), length};
 }
-
+Result eucjp_to_utf8(const std::string &euc) {
+    return to_utf8(StringFromEUCJPToUTF8, euc, euc.size() * 3 / 2 + 1);
+}
 Result sjis_to_utf8(const std::string &sjis) {
-    jptest::Guarded in(sjis);
-    std::string out(sjis.size() * 3 + 1, '\0');
-    uint32_t length = 0xDEAD;
-    const int ok = StringFromSJISToUTF8(in.c_str(), out.data(), &length);
-    out.resize(length - 1);
-    return {ok, out, length};
+    return to_utf8(StringFromSJISToUTF8, sjis, sjis.size() * 3 + 1);
 }
 
 // room: bytes allowed before the terminator. Guard bytes catch overruns.
