@@ -68,47 +68,38 @@ inline bool guard_intact(const std::vector<char> &buffer, size_t room) {
     return true;
 }
 
-// StringFromCharsetToUnicode over text (its terminator is appended: one 0
-// unit for the 16-bit charsets, else a NUL). Default room: plenty.
-inline Outcome to_unicode(CharsetId charset, const std::string &text, std::optional<uint32_t> room = {}) {
-    const bool unitText =
-        charset == CHARSET_UTF16 || charset == CHARSET_UTF16LE || charset == CHARSET_UTF16BE;
-    std::string source = text + std::string(unitText ? 2 : 1, '\0');
+// Runs one of the two string functions over source (terminator included)
+// into a guarded buffer of room bytes.
+template <class In, class Out>
+Outcome run_string(int (*fn)(CharsetId, const In **, Out **, uint32_t *), CharsetId charset,
+                   const std::string &source, std::optional<uint32_t> room) {
     const uint32_t r = room.value_or(static_cast<uint32_t>(source.size() * 4 + 8));
     std::vector<char> buffer(r + kGuard, static_cast<char>(kGuardByte));
-    const char *in = source.data();
-    auto *out = reinterpret_cast<uint16_t *>(buffer.data());
-    uint32_t length = r;
+    const auto *in = reinterpret_cast<const In *>(source.data());
+    auto *out = reinterpret_cast<Out *>(buffer.data());
     Outcome run{};
-    run.result = StringFromCharsetToUnicode(charset, &in, &out, &length);
-    run.length = length;
-    run.sourceMoved = static_cast<size_t>(in - source.data());
+    run.length = r;
+    run.result = fn(charset, &in, &out, &run.length);
+    run.sourceMoved = static_cast<size_t>(reinterpret_cast<const char *>(in) - source.data());
     run.destinationMoved = static_cast<size_t>(reinterpret_cast<char *>(out) - buffer.data());
-    const size_t end = run.result ? length : std::min<size_t>(run.destinationMoved + length, r);
+    const size_t end = run.result ? run.length : std::min<size_t>(run.destinationMoved + run.length, r);
     run.output.assign(buffer.data(), end);
     run.guardIntact = guard_intact(buffer, r);
     return run;
 }
 
-// StringFromUnicodeToCharset over units (a 0 unit is appended).
+// StringFromCharsetToUnicode over text, its terminator appended (a 0 unit
+// for the 16-bit charsets, else a NUL). Default room: plenty.
+inline Outcome to_unicode(CharsetId charset, const std::string &text, std::optional<uint32_t> room = {}) {
+    const bool unitText =
+        charset == CHARSET_UTF16 || charset == CHARSET_UTF16LE || charset == CHARSET_UTF16BE;
+    return run_string(StringFromCharsetToUnicode, charset, text + std::string(unitText ? 2 : 1, '\0'), room);
+}
+
+// StringFromUnicodeToCharset over units, a 0 unit appended.
 inline Outcome from_unicode(CharsetId charset, const std::u16string &units,
                             std::optional<uint32_t> room = {}) {
-    std::u16string source = units + u'\0';
-    const uint32_t r = room.value_or(static_cast<uint32_t>(source.size() * 4 + 8));
-    std::vector<char> buffer(r + kGuard, static_cast<char>(kGuardByte));
-    const uint16_t *in = reinterpret_cast<const uint16_t *>(source.data());
-    char *out = buffer.data();
-    uint32_t length = r;
-    Outcome run{};
-    run.result = StringFromUnicodeToCharset(charset, &in, &out, &length);
-    run.length = length;
-    run.sourceMoved = static_cast<size_t>(reinterpret_cast<const char *>(in) -
-                                          reinterpret_cast<const char *>(source.data()));
-    run.destinationMoved = static_cast<size_t>(out - buffer.data());
-    const size_t end = run.result ? length : std::min<size_t>(run.destinationMoved + length, r);
-    run.output.assign(buffer.data(), end);
-    run.guardIntact = guard_intact(buffer, r);
-    return run;
+    return run_string(StringFromUnicodeToCharset, charset, as_bytes(units + u'\0'), room);
 }
 
 }  // namespace enginetest

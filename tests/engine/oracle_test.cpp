@@ -170,56 +170,6 @@ TEST(EngineOracle, RandomUtf8BothWaysAndByCharacter) {
     walk_characters(CHARSET_UTF8, text, sizes, firstUnits);
 }
 
-namespace {
-// Strict UTF-8: the code point of the sequence at p, or 0 bytes when none
-// starts there.
-size_t strict_utf8(const unsigned char *p, size_t n, char32_t &cp) {
-    const unsigned char b = p[0];
-    size_t len = b < 0x80                 ? 1
-                 : b >= 0xC2 && b <= 0xDF ? 2
-                 : b >= 0xE0 && b <= 0xEF ? 3
-                 : b >= 0xF0 && b <= 0xF4 ? 4
-                                          : 0;
-    if (len == 0 || len > n) return 0;
-    cp = len == 1 ? b : b & (0x7F >> len);
-    for (size_t i = 1; i < len; ++i) {
-        if ((p[i] & 0xC0) != 0x80) return 0;
-        cp = cp << 6 | (p[i] & 0x3F);
-    }
-    const char32_t least[] = {0, 0, 0x80, 0x800, 0x10000};
-    if (cp < least[len] || cp > 0x10FFFF || (cp >= 0xD800 && cp <= 0xDFFF)) return 0;
-    return len;
-}
-}  // namespace
-
-TEST(EngineOracle, BrokenUtf8GetsOneSubstitutePerRejectedByte) {
-    std::mt19937 rng(11);
-    const std::vector<std::string> pieces = {
-        "a",        "\xC3\xA9",     "\xE2\x82\xAC", "\xF0\x9F\x98\x80", "\x80",     "\xBF",
-        "\xC0\xAF", "\xE0\x80\xAF", "\xED\xA0\x80", "\xF4\x90\x80\x80", "\xE2\x82", "\xF0\x9F\x98",
-        "\xFE",     "\xFF",         "\xC3"};
-    for (int round = 0; round < 200; ++round) {
-        std::string text;
-        for (int i = 0; i < 30; ++i) text += pieces[rng() % pieces.size()];
-        std::u16string expected;
-        const auto *p = reinterpret_cast<const unsigned char *>(text.data());
-        for (size_t i = 0; i < text.size();) {
-            char32_t cp = 0;
-            const size_t len = strict_utf8(p + i, text.size() - i, cp);
-            if (len == 0) cp = 0xFFFD;
-            if (cp >= 0x10000)
-                expected += {char16_t(0xD7C0 + (cp >> 10)), char16_t(0xDC00 | (cp & 0x3FF))};
-            else
-                expected += char16_t(cp);
-            i += len ? len : 1;
-        }
-        Outcome run = to_unicode(CHARSET_UTF8, text);
-        ASSERT_EQ(run.result, 1);
-        ASSERT_EQ(run.units(), expected + u'\0') << testsupport::hex(text);
-        EXPECT_EQ(run.sourceMoved, text.size() + 1);
-    }
-}
-
 TEST(EngineOracle, UnitsACharsetLacksBecomeQuestionMarks) {
     std::mt19937 rng(5);
     const std::vector<std::pair<char16_t, char16_t>> ranges = {

@@ -127,7 +127,6 @@ TEST(EngineMarks, UnitsWrittenWithAMarkEveryCall) {
               std::u16string(u"\xFEFF"
                              "A") +
                   u'\0');
-    EXPECT_EQ(to_unicode(CHARSET_LATIN1, "\xEF\xBB\xBF").units(), std::u16string(u"\xEF\xBB\xBF") + u'\0');
 
     struct Case {
         const char *source;
@@ -165,7 +164,7 @@ TEST(EngineMissing, AskedOnceThenEveryCallFailsWithItsMessage) {
     // glibc knows neither "UTF16-LE" nor "UTF16-BE".
     testing::internal::CaptureStderr();
     for (int i = 0; i < 2; ++i) {
-        Outcome out = from_unicode(CHARSET_UTF16LE, u"AB");
+        Outcome out = from_unicode(CHARSET_UTF16LE, u"AB", 20);
         EXPECT_EQ(out.result, 0);
         EXPECT_EQ(out.length, 20u);  // the room, unchanged
         EXPECT_EQ(out.sourceMoved + out.destinationMoved, 0u);
