@@ -123,9 +123,10 @@ TEXTCONV_API int StringFromUTF8ToUnicode(const char *source, uint16_t *target, u
 TEXTCONV_API int StringFromUnicodeToUTF8(const uint16_t *source, char *target, uint32_t *length);
 
 /* One UTF-8 character at *cursor to one or two units in target (room for 2
- * units). *cursor always advances past the sequence (never past a NUL).
+ * units). *cursor always advances past the sequence, and never past a NUL
+ * inside it (a NUL at *cursor is a character of its own: unit 0, advance 1).
  * *written receives 2 or 4 (bytes) on success only. Returns 1 or 0.
- * A sequence cut short by the NUL fails with *cursor on the NUL; a lead byte
+ * A sequence cut short by a NUL fails with *cursor on the NUL; a lead byte
  * followed by a byte that is not a trailing byte gives one U+FFFD and moves
  * *cursor past the lead byte only. An overlong or surrogate sequence of 3 or
  * more bytes fails (its U+FFFD units do not fit in 2), *cursor past it. */
