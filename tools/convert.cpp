@@ -3,6 +3,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <cstdio>
@@ -72,12 +73,6 @@ size_t cut_point(CharsetId id, std::string_view data) {
 }
 
 namespace {
-
-size_t count_units(const std::u16string &units, char16_t unit) {
-    size_t n = 0;
-    for (char16_t u : units) n += u == unit;
-    return n;
-}
 
 std::string count_text(uint64_t n, const char *one, const char *many) {
     return std::to_string(n) + " " + (n == 1 ? one : many);
@@ -184,12 +179,10 @@ class Pipeline {
                 }
                 break;
             }
-            case Path::ViaUnicode: {
-                std::u16string units;
-                subs = decode(in, last, units);
-                subs += encode(units, out);
+            case Path::ViaUnicode:
+                subs = decode(in, last);
+                subs += encode(out);
                 break;
-            }
         }
         return subs;
     }
@@ -228,31 +221,30 @@ class Pipeline {
 
     // ---- X to UTF-16 ----
 
-    uint64_t decode(std::string_view in, bool last, std::u16string &units) {
-        if (from_.id == CHARSET_UTF8) return decode_utf8(in, units);
-        if (!decodes_) return decode_without_converter(in, units);
+    uint64_t decode(std::string_view in, bool last) {
+        if (from_.id == CHARSET_UTF8) return decode_utf8(in);
+        if (!decodes_) return decode_without_converter(in);
+        const bool utf16 = is_utf16_family(from_.id);
         uint64_t subs = 0;
         std::string_view text = in;
-        const bool oddByte = is_utf16_family(from_.id) && text.size() % 2;  // a last odd byte is no unit
+        const bool oddByte = utf16 && text.size() % 2;  // a last odd byte is no unit
         if (oddByte) text.remove_suffix(1);
         // Only the last piece can end inside a character; the engine refuses
         // that, so its tail becomes one substitute.
-        const size_t maxTrim = last ? (is_utf16_family(from_.id) ? 2 : 3) : 0;
-        for (size_t trim = 0; trim <= maxTrim && trim <= text.size();
-             trim += is_utf16_family(from_.id) ? 2 : 1) {
-            std::string source(text.substr(0, text.size() - trim));
-            source.append(2, '\0');
-            units.assign(source.size() + 8, u'\0');
-            const char *from = source.c_str();
-            uint16_t *to = reinterpret_cast<uint16_t *>(units.data());
-            uint32_t length = static_cast<uint32_t>(units.size() * 2);
+        const size_t maxTrim = last ? (utf16 ? 2 : 3) : 0;
+        for (size_t trim = 0; trim <= maxTrim && trim <= text.size(); trim += utf16 ? 2 : 1) {
+            source_.assign(text.data(), text.size() - trim);
+            source_.append(2, '\0');
+            room(units_, source_.size() + 8);
+            const char *from = source_.c_str();
+            uint16_t *to = reinterpret_cast<uint16_t *>(units_.data());
+            uint32_t length = static_cast<uint32_t>(units_.size() * 2);
             if (StringFromCharsetToUnicode(from_.id, &from, &to, &length) && length >= 2) {
-                units.resize(length / 2 - 1);
-                const size_t made = count_units(units, u'\xFFFD'),
-                             own = count_occurrences(source, replacementIn_);
+                count_ = length / 2 - 1;
+                const size_t made = count_units(u'\xFFFD'), own = count_occurrences(source_, replacementIn_);
                 subs += made > own ? made - own : 0;
                 if (trim || oddByte) {
-                    units.push_back(u'\xFFFD');
+                    units_[count_++] = u'\xFFFD';
                     ++subs;
                 }
                 return subs;
@@ -261,21 +253,21 @@ class Pipeline {
         throw Failure(kExitBadInput, "the text cannot be read as " + from_.label);
     }
 
-    uint64_t decode_utf8(std::string_view in, std::u16string &units) {
-        units.assign(in.size() + 2, u'\0');
-        const uint32_t capacity = static_cast<uint32_t>(units.size() * 2);
+    uint64_t decode_utf8(std::string_view in) {
+        room(units_, in.size() + 2);
+        const uint32_t capacity = static_cast<uint32_t>(units_.size() * 2);
         // A sequence cut short at the end of the text becomes one U+FFFD.
         for (size_t trim = 0; trim <= 6 && trim <= in.size(); ++trim) {
             uint32_t written = 0;
             uint32_t r = ConvertUTF8toUTF16(in.data(), static_cast<uint32_t>(in.size() - trim),
-                                            reinterpret_cast<uint16_t *>(units.data()), capacity, &written);
+                                            reinterpret_cast<uint16_t *>(units_.data()), capacity, &written);
             if (r == TEXTCONV_UTF_SOURCE_INCOMPLETE) continue;
             if (r != TEXTCONV_UTF_DONE) fail_library("ConvertUTF8toUTF16");
-            units.resize(written / 2);
-            const size_t made = count_units(units, u'\xFFFD'), own = count_occurrences(in, kReplacementUtf8);
+            count_ = written / 2;
+            const size_t made = count_units(u'\xFFFD'), own = count_occurrences(in, kReplacementUtf8);
             uint64_t subs = made > own ? made - own : 0;
             if (trim) {
-                units.push_back(u'\xFFFD');
+                units_[count_++] = u'\xFFFD';
                 ++subs;
             }
             return subs;
@@ -285,21 +277,23 @@ class Pipeline {
 
     // No converter (the user chose to go on): ASCII passes, every other
     // character becomes U+FFFD.
-    uint64_t decode_without_converter(std::string_view in, std::u16string &units) {
+    uint64_t decode_without_converter(std::string_view in) {
         uint64_t subs = 0;
+        room(units_, in.size() + 2);
+        count_ = 0;
         if (is_utf16_family(from_.id)) {
             for (size_t i = 0; i + 1 < in.size(); i += 2) {
                 const unsigned a = static_cast<unsigned char>(in[i]),
                                b = static_cast<unsigned char>(in[i + 1]);
                 const unsigned unit = from_.id == CHARSET_UTF16BE ? a << 8 | b : b << 8 | a;
                 if (unit == 0xFEFF && i == 0) continue;
-                units.push_back(unit < 0x80 ? static_cast<char16_t>(unit) : u'\xFFFD');
+                units_[count_++] = unit < 0x80 ? static_cast<char16_t>(unit) : u'\xFFFD';
                 subs += unit >= 0x80;
             }
             return subs;
         }
         for (unsigned char c : in) {
-            units.push_back(c < 0x80 ? c : u'\xFFFD');
+            units_[count_++] = c < 0x80 ? c : u'\xFFFD';
             subs += c >= 0x80;
         }
         return subs;
@@ -307,44 +301,40 @@ class Pipeline {
 
     // ---- UTF-16 to Y ----
 
-    uint64_t encode(const std::u16string &units, std::string &out) {
+    uint64_t encode(std::string &out) {
+        if (!encodes_ && to_.id != CHARSET_UTF8) return encode_without_converter(out);
+        room(units_, count_ + 1);
+        units_[count_] = 0;
+        const uint16_t *from = reinterpret_cast<const uint16_t *>(units_.data());
         if (to_.id == CHARSET_UTF8) {
-            std::u16string source = units;
-            source.push_back(0);
-            std::string buffer(3 * source.size() + 4, '\0');
-            uint32_t length = static_cast<uint32_t>(buffer.size());
-            if (!StringFromUnicodeToUTF8(reinterpret_cast<const uint16_t *>(source.c_str()), buffer.data(),
-                                         &length) ||
-                length == 0)
+            room(bytes_, 3 * count_ + 4);
+            uint32_t length = static_cast<uint32_t>(bytes_.size());
+            if (!StringFromUnicodeToUTF8(from, bytes_.data(), &length) || length == 0)
                 fail_library("StringFromUnicodeToUTF8");
-            out.append(buffer.data(), length - 1);
+            out.append(bytes_.data(), length - 1);
             return 0;
         }
-        if (!encodes_) return encode_without_converter(units, out);
-        std::u16string source = units;
-        source.push_back(0);
-        std::string buffer(4 * source.size() + 8, '\0');
-        const uint16_t *from = reinterpret_cast<const uint16_t *>(source.c_str());
-        char *to = buffer.data();
-        uint32_t length = static_cast<uint32_t>(buffer.size());
+        room(bytes_, 4 * count_ + 12);
+        char *to = bytes_.data();
+        uint32_t length = static_cast<uint32_t>(bytes_.size());
         if (!StringFromUnicodeToCharset(to_.id, &from, &to, &length))
             fail_library("StringFromUnicodeToCharset");
         const size_t terminator = is_utf16_family(to_.id) ? 2 : 1;
-        if (length < terminator || length > buffer.size()) fail_library("StringFromUnicodeToCharset");
-        std::string_view produced(buffer.data(), length - terminator);
+        if (length < terminator || length > bytes_.size()) fail_library("StringFromUnicodeToCharset");
+        std::string_view produced(bytes_.data(), length - terminator);
         out.append(produced);
         if (terminator == 2) return 0;
         // "?" written for a unit the charset cannot hold; a U+FFFD that the
         // decoding put in and that became "?" is counted there already.
         const size_t marks = count_occurrences(produced, "?");
-        const size_t expected =
-            count_units(units, u'?') + (replacementOut_.empty() ? count_units(units, u'\xFFFD') : 0);
+        const size_t expected = count_units(u'?') + (replacementOut_.empty() ? count_units(u'\xFFFD') : 0);
         return marks > expected ? marks - expected : 0;
     }
 
-    uint64_t encode_without_converter(const std::u16string &units, std::string &out) {
+    uint64_t encode_without_converter(std::string &out) {
         uint64_t subs = 0;
-        for (char16_t u : units) {
+        for (size_t i = 0; i < count_; ++i) {
+            const char16_t u = units_[i];
             const char16_t unit = u < 0x80 ? u : u'?';
             subs += u >= 0x80 && u != 0xFFFD;
             if (to_.id == CHARSET_UTF16BE) {
@@ -358,6 +348,18 @@ class Pipeline {
             }
         }
         return subs;
+    }
+
+    // Scratch buffers only grow: no clearing or allocating per piece.
+    template <typename Buffer>
+    static void room(Buffer &buffer, size_t size) {
+        if (buffer.size() < size) buffer.resize(size + size / 2);
+    }
+
+    size_t count_units(char16_t unit) const {
+        size_t n = 0;
+        for (size_t i = 0; i < count_; ++i) n += units_[i] == unit;
+        return n;
     }
 
     // ---- server code pages ----
@@ -504,6 +506,9 @@ class Pipeline {
     Path path_ = Path::ViaUnicode;
     bool decodes_ = true, encodes_ = true;
     std::string replacementIn_, replacementOut_;
+    std::u16string units_;  // the text as UTF-16: count_ units
+    size_t count_ = 0;
+    std::string source_, bytes_;
 };
 
 // A progress line on stderr for long inputs.
@@ -573,6 +578,8 @@ uint64_t convert_stream(Pipeline &pipeline, const std::string &path, const Chars
     const bool units = is_utf16_family(from.id);
     const size_t chunk = options.chunkSize;
     std::string pending, converted;
+    std::string readBuffer(chunk, '\0');
+    pending.reserve(chunk);
     uint64_t offset = 0;    // bytes read so far
     uint64_t consumed = 0;  // bytes converted so far
     uint64_t line = 1;      // line number of the start of the pending text
@@ -581,25 +588,27 @@ uint64_t convert_stream(Pipeline &pipeline, const std::string &path, const Chars
     while (true) {
         if (!eof && pending.size() < chunk) {
             const size_t before = pending.size();
-            pending.resize(chunk);
-            const size_t got = std::fread(pending.data() + before, 1, chunk - before, file);
-            pending.resize(before + got);
+            const size_t got = std::fread(readBuffer.data(), 1, chunk - before, file);
+            pending.append(readBuffer.data(), got);
             if (got < chunk - before) {
                 if (std::ferror(file))
                     throw Failure(kExitBadInput, "cannot read " + name + ": " + std::strerror(errno));
                 eof = true;
             }
             // A NUL would end the text for the library: refuse it, where it is.
-            for (size_t i = before; i < pending.size(); ++i) {
-                const uint64_t at = offset + (i - before);
-                if (units) {
+            if (!units) {
+                if (const void *nul = std::memchr(pending.data() + before, 0, got))
+                    throw Failure(kExitBadInput, name + ": NUL byte at byte offset " +
+                                                     std::to_string(offset + (static_cast<const char *>(nul) -
+                                                                              pending.data() - before)) +
+                                                     " (the text must not contain NUL)");
+            } else {
+                for (size_t i = before; i < pending.size(); ++i) {
+                    const uint64_t at = offset + (i - before);
                     if (at % 2 == 1 && pending[i] == 0 && pending[i - 1] == 0)
                         throw Failure(kExitBadInput, name + ": a 0 unit at byte offset " +
                                                          std::to_string(at - 1) +
                                                          " (the text must not contain NUL)");
-                } else if (pending[i] == 0) {
-                    throw Failure(kExitBadInput, name + ": NUL byte at byte offset " + std::to_string(at) +
-                                                     " (the text must not contain NUL)");
                 }
             }
             offset += got;
@@ -618,7 +627,7 @@ uint64_t convert_stream(Pipeline &pipeline, const std::string &path, const Chars
                                            " in the text from line " + std::to_string(line) +
                                            " (--strict makes any substitution an error)");
         }
-        for (char c : piece) line += c == '\n';
+        if (options.strict) line += std::count(piece.begin(), piece.end(), '\n');
         consumed += cut;
         pending.erase(0, cut);
         progress.update(consumed);
