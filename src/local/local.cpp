@@ -49,13 +49,18 @@ bool converter_open(CharsetId charset) {
     return cell != textconv::unopened_cell() && cell != textconv::failed_cell();
 }
 
+// The local charset never changes in a process; should another charset come
+// here, the cache starts again for it.
+inline void claim_cache(CharsetId charset) {
+    if (unitCache.charset == charset) return;
+    std::memset(unitCache.entries, 0, sizeof unitCache.entries);
+    unitCache.charset = charset;
+}
+
 // FromUnicodeToCharset, through the cache for a single-byte charset.
 int unit_to_charset(CharsetId charset, uint32_t unit, char **cursor) {
     if (!is_single_byte(charset)) return FromUnicodeToCharset(charset, unit, cursor);
-    if (unitCache.charset != charset) {
-        std::memset(unitCache.entries, 0, sizeof unitCache.entries);
-        unitCache.charset = charset;
-    }
+    claim_cache(charset);
     const auto u = static_cast<uint16_t>(unit);
     UnitByteCache::Entry &e = unitCache.entries[slot_of(u)];
     if (e.state != 0 && e.unit == u) {
@@ -119,7 +124,22 @@ TEXTCONV_API int StringFromUTF8ToLocal(const char *source, char *target, uint32_
     }
     int result = 1;
     char *out = target;
-    for (uint32_t i = 0, count = decoded / 2; i < count && units[i] != 0; ++i) {
+    const uint32_t count = decoded / 2;
+    uint32_t i = 0;
+    if (is_single_byte(local)) {
+        // Units seen before take their byte from the cache.
+        claim_cache(local);
+        for (; i < count && units[i] != 0; ++i) {
+            const UnitByteCache::Entry e = unitCache.entries[slot_of(units[i])];
+            if (e.state == 1 && e.unit == units[i]) {
+                *out++ = static_cast<char>(e.byte);
+            } else if (!unit_to_charset(local, units[i], &out)) {
+                *out++ = '?';
+                result = 0;
+            }
+        }
+    }
+    for (; i < count && units[i] != 0; ++i) {
         // A surrogate pair goes over as two separate units.
         if (!unit_to_charset(local, units[i], &out)) {
             *out++ = '?';
