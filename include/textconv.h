@@ -411,14 +411,17 @@ TEXTCONV_API int StringFromUTF8ToLocal(const char *source, char *target, uint32_
  * local encoding is converted through UTF-16 (the Latin-1, EUC-JP, UTF-8 and
  * KOI8-R paths need 2, 3/2, 1 and 3 bytes per source byte plus 1); out: bytes
  * written including the NUL, 0 when the output did not fit (empty string
- * written). Returns 1, or 0 on the EUC-JP path for a bad sequence. */
+ * written; nothing at all with a capacity of 0). On that path no memory or no
+ * converter also gives the empty string, with *length 1. Returns 1, or 0 on
+ * the EUC-JP path for a bad sequence (partial output, no NUL, *length kept). */
 TEXTCONV_API int StringFromLocalToUTF8(const char *source, char *target, uint32_t *length);
 
 /* Replaces a list of 0-terminated UTF-16 strings (*length bytes; the block
  * must come from HostMalloc) with a NEW block from HostMalloc holding the
  * strings in the local encoding plus one closing NUL; *length receives its
  * byte length. The old block is released. Unconvertible units become "?".
- * When memory runs out the caller's list and length are left as they were. */
+ * A last string with no 0 unit within *length ends at the list's end. When
+ * memory runs out the caller's list and length are left as they were. */
 TEXTCONV_API void StringListFromUnicodeToLocal(uint16_t **list, uint32_t *length);
 
 /* Little-endian 16-bit units (*length bytes available, in) to a NUL-terminated
@@ -450,8 +453,10 @@ enum { DIRECTION_LTR = 0, DIRECTION_RTL = 1, DIRECTION_NEUTRAL = 2 };
  * "%l" before each left-to-right run, "%r" before each right-to-left run and
  * "%" doubled. *length in: L, the target's room in bytes, which also bounds
  * the work (about L/2 characters are taken); out: bytes written including the
- * terminator. When a conversion fails the source is copied with strncpy(target,
- * source, L) and *length keeps its value. Always returns 1. */
+ * terminator. When a conversion fails (among others, the source in UTF-16
+ * needing more than 2 L bytes or the escaped text more than L bytes), or a
+ * large L finds no scratch memory at the host, the source is copied with
+ * strncpy(target, source, L) and *length keeps its value. Always returns 1. */
 TEXTCONV_API int StringFromCharsetToDirectionEscapedString(CharsetId charset, char *target, const char *source,
                                                            uint32_t *length);
 
