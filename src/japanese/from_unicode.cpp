@@ -127,7 +127,7 @@ TEXTCONV_API int FromUnicodeToEUCJP(uint16_t unit, char **cursor) {
         *cursor += 1;
         return 1;
     }
-    uint8_t kind, code[2], length;
+    uint8_t kind = 0, code[2] = {0, 0}, length = 0;
     if (!unicode_to_multibyte(unit, MB_KIND_ANY, &kind, code, &length)) return 0;
     size_t written;
     switch (kind) {
