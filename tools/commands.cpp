@@ -109,6 +109,9 @@ int run_locale(bool rewriteUtf8) {
             }
         }
     }
+    if (!how.empty() && ctype && !(codesetRaw && GetiStringID(codesetRaw, charsets)))
+        std::printf("  find_charset_from(\"%s\"): %s\n", name.c_str(),
+                    describe(find_charset_from(name.c_str())).c_str());
     std::printf("decided by:       %s\n", how.c_str());
 
     const CharsetId local = rewriteUtf8 ? SetCurrentLocale(1) : LocalEncoding();
