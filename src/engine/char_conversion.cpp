@@ -88,7 +88,7 @@ TEXTCONV_API int FromCharsetToUnicode(CharsetId charset, const char **source, ui
             const int error = errno;
             if (error == EILSEQ) {
                 // One byte past the rejected sequence; one unit in 16-bit text.
-                *source = start + (is_unit_charset(charset) ? 2 : 1);
+                *source = in + (is_unit_charset(charset) ? 2 : 1);
                 *destination = kReplacement;
                 *length = 2;
                 return 1;

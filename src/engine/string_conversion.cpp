@@ -170,7 +170,8 @@ int string_from_charset_to_unicode(CharsetId charset, const char **source, uint1
         char *passOutput = reinterpret_cast<char *>(*destination);
         const uint32_t room = *length;
         const bool withheld = terminatorOutsideConverter != 0;
-        const size_t inBytes = static_cast<size_t>(end - passSource) - (withheld ? 1 : 0);
+        const size_t rest = static_cast<size_t>(end - passSource);
+        const size_t inBytes = withheld && rest > 0 ? rest - 1 : rest;
         char *in = const_cast<char *>(passSource);
         size_t inLeft = inBytes;
         char *out = passOutput;

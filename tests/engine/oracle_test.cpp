@@ -274,6 +274,16 @@ TEST(EngineOracle, CharacterDecoderThatTakesAMarkDeliversTheNextCharacter) {
     EXPECT_EQ(p, marked + 4);
 }
 
+TEST(EngineOracle, CharacterDecoderStepsPastATakenMarkAndARejectedUnit) {
+    const char marked[] = {'\xFF', '\xFE', '\x00', '\xDC', 'A', '\0', '\0', '\0'};
+    const char *p = marked;
+    uint16_t unit = 0;
+    uint32_t length = 0;
+    ASSERT_EQ(FromCharsetToUnicode(CHARSET_UTF16, &p, &unit, &length), 1);
+    EXPECT_EQ(unit, 0xFFFD);
+    EXPECT_EQ(p, marked + 4);
+}
+
 TEST(EngineOracle, RoomIsNeverExceeded) {
     // To UTF-16 (the first call meets glibc's mark), and from UTF-16, with
     // substitutes in the text: every room below the need fails, nothing is
