@@ -34,18 +34,13 @@ struct Example {
     const char *escaped;
 };
 
-// Hebrew letters in ISO-8859-8: alef E0, bet E1.
+// What the walk's own tests leave out: the charsets. Hebrew letters in
+// ISO-8859-8: alef E0, bet E1.
 const Example kExamples[] = {
     {CHARSET_LATIN1, "abc", 100, "%labc"},
     {CHARSET_ISO8859_8, "\xE0\xE1", 100, "%r\xE0\xE1"},
     {CHARSET_ISO8859_8, "abc \xE0\xE1 12", 100, "%labc %r\xE0\xE1%l 12"},
-    {CHARSET_ISO8859_8, "- \xE0", 100, "- %r\xE0"},
-    {CHARSET_LATIN1, "- ab", 100, "%l- ab"},
-    {CHARSET_LATIN1, "?!", 100, "?!"},
-    {CHARSET_ISO8859_8, "\xE0.", 100, "%r\xE0."},
-    {CHARSET_ISO8859_8, "\xE0 \xE1", 100, "%r\xE0 \xE1"},
     {CHARSET_LATIN1, "50%", 100, "%l50%%"},
-    {CHARSET_LATIN1, "%lx", 100, "%l%%lx"},
     {CHARSET_LATIN1, "caf\xE9 \xD7 2", 100, "%lcaf\xE9 \xD7 2"},  // the multiplication sign is neutral
     {CHARSET_LATIN1, "abcde", 10, "%labcd"},                      // the d brings the budget to 10
     {CHARSET_UTF8,

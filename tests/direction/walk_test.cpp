@@ -118,16 +118,6 @@ TEST(DirectionWalk, UnitClassesAtTheRangeEdges) {
             << "U+" << std::hex << u;
 }
 
-TEST(DirectionWalk, RealScripts) {
-    // Arabic-Indic digits are right-to-left, ASCII digits left-to-right.
-    EXPECT_EQ(walk(u"12\u0628", 100), u"%l12%r\u0628");
-    EXPECT_EQ(walk(u"\u0661\u0662 a", 100), u"%r\u0661\u0662%l a");
-    // Cyrillic, Syriac, the multiplication sign: neutral, no escape at all.
-    EXPECT_EQ(walk(u"\u041c\u0438\u0440 \u0710\u00d7", 100), u"\u041c\u0438\u0440 \u0710\u00d7");
-    // A surrogate pair is two neutral units.
-    EXPECT_EQ(walk(u"\U0001F600a", 100), u"%l\U0001F600a");
-}
-
 // Random text of left-to-right, right-to-left and neutral units and "%",
 // walked with a random room: every property of escaped text holds.
 TEST(DirectionWalk, RandomTextKeepsEveryProperty) {
