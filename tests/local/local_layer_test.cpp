@@ -401,7 +401,7 @@ TEST(LOCAL_SUITE, EquivalenceAcrossEncodings) {
 }
 
 // The cases that only one local charset shows.
-TEST(LOCAL_SUITE, CharsetSpecificCases) {
+TEST(LOCAL_SUITE, CasesOfOneCharsetOnly) {
     char target[32];
     uint32_t length = 0;
     if constexpr (kLocal == CHARSET_LATIN1) {
