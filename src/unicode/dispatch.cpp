@@ -16,8 +16,10 @@ struct Paths {
 };
 
 constexpr Paths kScalar = {"scalar", utf8_to_utf16_scalar, utf16_to_utf8_scalar, latin1_to_utf8_scalar};
+#if !defined(__x86_64__)
 constexpr Paths kWords = {"words", fast::utf8_to_utf16_words, fast::utf16_to_utf8_words,
                           fast::latin1_to_utf8_words};
+#endif
 #if defined(__x86_64__)
 constexpr Paths kSse2 = {"sse2", fast::utf8_to_utf16_sse2, fast::utf16_to_utf8_sse2,
                          fast::latin1_to_utf8_sse2};
