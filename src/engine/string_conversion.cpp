@@ -49,7 +49,7 @@ constexpr Word kHighBits = kLowBits << 15;    // 0x8000 in every unit
 constexpr uintptr_t kBlock = 2 * sizeof(Word);
 #endif
 
-__attribute__((no_sanitize("address"))) size_t unit_count(const uint16_t *text) {
+__attribute__((noinline, no_sanitize("address"))) size_t unit_count(const uint16_t *text) {
     const uint16_t *p = text;
     for (; reinterpret_cast<uintptr_t>(p) % kBlock != 0; ++p)
         if (*p == 0) return static_cast<size_t>(p - text) + 1;
