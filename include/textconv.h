@@ -216,7 +216,8 @@ TEXTCONV_API void apply_locale_name(const char *name);
 /* ===================================================================== */
 
 /* 0-terminated UTF-16 at *source to charset at *destination, terminator
- * converted along. Units the charset cannot hold become "?", one per unit.
+ * converted along. Units the charset cannot hold become "?", one per unit
+ * (a 16-bit "?" for the UTF-16 ids).
  * *length in: room in bytes; out on success: bytes written including the
  * terminator, and both pointers advanced past what was read and written.
  * Returns 0 when no converter exists (a message on stderr, nothing changed)

@@ -109,6 +109,17 @@ int string_from_unicode_to_charset(CharsetId charset, const uint16_t **source, c
         return 0;
     }
 
+    // The substitute: "?" in the target's own form. A 16-bit target takes a
+    // whole unit, so that the text after it stays aligned on its units.
+    char substitute[2] = {'?', 0};
+    size_t substituteSize = 1;
+    if (is_unit_charset(charset)) {
+        const uint16_t hostUnit = '?';
+        if (charset == CHARSET_UTF16) memcpy(substitute, &hostUnit, 2);
+        if (charset == CHARSET_UTF16BE) substitute[0] = 0, substitute[1] = '?';
+        substituteSize = 2;
+    }
+
     const uint16_t *end = text + units;
     uint32_t total = 0;
     for (;;) {
@@ -130,15 +141,15 @@ int string_from_unicode_to_charset(CharsetId charset, const uint16_t **source, c
         }
         // A full destination, or no room left for the "?": fail without
         // another call, the pointers on this pass's start.
-        if (error != EILSEQ || outLeft == 0 || inLeft < 2) {
+        if (error != EILSEQ || outLeft < substituteSize || inLeft < 2) {
             *length = written;
             return 0;
         }
-        *out = '?';
+        memcpy(out, substitute, substituteSize);
         *source = reinterpret_cast<const uint16_t *>(in) + 1;
-        *destination = out + 1;
-        total += written + 1;
-        *length = static_cast<uint32_t>(outLeft) - 1;
+        *destination = out + substituteSize;
+        total += written + static_cast<uint32_t>(substituteSize);
+        *length = static_cast<uint32_t>(outLeft - substituteSize);
     }
 }
 

@@ -236,7 +236,17 @@ TEST(EngineOracle, UnitTextOfEveryLengthAndAlignment) {
         }
 }
 
-TEST(EngineOracle, SixteenBitSourceStaysInStepAfterARejectedUnit) {
+TEST(EngineOracle, SixteenBitTextStaysInStepAfterARejectedUnit) {
+    // A UTF-16 target takes "?" as a unit (glibc marks its first output).
+    Outcome out = from_unicode(CHARSET_UTF16,
+                               u"A\xD800"
+                               u"B\xDC00");
+    ASSERT_EQ(out.result, 1);
+    EXPECT_EQ(out.units(), std::u16string(u"\xFEFF"
+                                          u"A?B?") +
+                               u'\0');
+    EXPECT_EQ(out.destinationMoved, out.length);
+
     const std::u16string text =
         u"A\xDC00"
         u"B\xD800"
