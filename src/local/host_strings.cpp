@@ -32,7 +32,10 @@ TEXTCONV_API void StringListFromUnicodeToLocal(uint16_t **list, uint32_t *length
     };
 
     while (source < sourceEnd) {
+        // Every write below leaves the closing NUL its byte, whatever the
+        // engine made of the strings before.
         if (*source == 0) {  // an empty string
+            if (outEnd - out < 2) break;
             *out++ = '\0';
             ++source;
             continue;
@@ -49,7 +52,7 @@ TEXTCONV_API void StringListFromUnicodeToLocal(uint16_t **list, uint32_t *length
         const uint16_t *from = source;
         char *into = out;
         uint32_t room = static_cast<uint32_t>(outEnd - out - 1);  // keep the closing NUL's byte
-        if (StringFromUnicodeToCharset(local, &from, &into, &room)) {
+        if (StringFromUnicodeToCharset(local, &from, &into, &room) && from > source) {
             source = from;
             out = into;
         } else {
