@@ -62,10 +62,14 @@ class Tour {
 
     void section(const char *title, const char *how) { std::printf("\n== %s\n   (%s)\n", title, how); }
     void show(const std::string &label, const std::string &text) {
-        std::string shown = text;
-        while (!shown.empty() && shown.back() == '\n') shown.pop_back();
-        size_t at = 0;
-        while ((at = shown.find('\n', at)) != std::string::npos) shown.replace(at++, 1, "\n" + pad(label));
+        size_t end = text.size();
+        while (end > 0 && text[end - 1] == '\n') --end;
+        // Continuation lines line up under the first one.
+        std::string shown;
+        for (size_t i = 0; i < end; ++i) {
+            shown += text[i];
+            if (text[i] == '\n') shown += pad(label);
+        }
         std::printf("   %s%s\n", label.c_str(), shown.c_str());
     }
     void failed(const char *what) {
