@@ -1,10 +1,11 @@
-// Helpers for the charset engine tests: a cached glibc iconv oracle and the
-// string functions run over guarded buffers.
+// Helpers for the engine tests: a glibc iconv oracle and the conversion
+// functions run over guarded buffers.
 #pragma once
 
 #include <gtest/gtest.h>
 #include <iconv.h>
 
+#include <algorithm>
 #include <cstring>
 #include <optional>
 #include <string>
@@ -14,21 +15,21 @@
 
 namespace enginetest {
 
-// glibc iconv, one descriptor per oracle, reset before every conversion.
+// glibc iconv, reset before every conversion.
 class Oracle {
   public:
     Oracle(const char *to, const char *from) : cd_(iconv_open(to, from)) {}
     ~Oracle() {
-        if (ok()) iconv_close(cd_);
+        if (cd_ != iconv_t(-1)) iconv_close(cd_);
     }
-    bool ok() const { return cd_ != reinterpret_cast<iconv_t>(-1); }
     std::optional<std::string> operator()(const std::string &in) {
         iconv(cd_, nullptr, nullptr, nullptr, nullptr);
         std::string out(in.size() * 4 + 8, '\0');
         char *ip = const_cast<char *>(in.data()), *op = out.data();
         size_t il = in.size(), ol = out.size();
-        if (iconv(cd_, &ip, &il, &op, &ol) == static_cast<size_t>(-1)) return std::nullopt;
-        if (iconv(cd_, nullptr, nullptr, &op, &ol) == static_cast<size_t>(-1)) return std::nullopt;
+        if (iconv(cd_, &ip, &il, &op, &ol) == size_t(-1) ||
+            iconv(cd_, nullptr, nullptr, &op, &ol) == size_t(-1))
+            return std::nullopt;
         out.resize(out.size() - ol);
         return out;
     }
@@ -47,59 +48,78 @@ inline std::string as_bytes(const std::u16string &units) {
 }
 
 constexpr size_t kGuard = 16;
-constexpr unsigned char kGuardByte = 0xA5;
+constexpr char kGuardByte = '\xA5';
+
+inline bool guard_intact(const std::vector<char> &buffer, size_t room) {
+    return std::all_of(buffer.begin() + room, buffer.end(), [](char c) { return c == kGuardByte; });
+}
 
 // What a string function did: result, the text up to *destination + *length
-// (the whole output on success), how far each pointer moved (bytes) and
+// (the whole output on success), how far each pointer moved (bytes), and
 // whether the bytes past the room are untouched.
 struct Outcome {
     int result;
     std::string output;
     uint32_t length;
-    size_t sourceMoved;
-    size_t destinationMoved;
+    size_t sourceMoved, destinationMoved;
     bool guardIntact;
     std::u16string units() const { return as_units(output); }
 };
 
-inline bool guard_intact(const std::vector<char> &buffer, size_t room) {
-    for (size_t i = room; i < buffer.size(); ++i)
-        if (static_cast<unsigned char>(buffer[i]) != kGuardByte) return false;
-    return true;
-}
-
-// Runs one of the two string functions over source (terminator included)
-// into a guarded buffer of room bytes.
 template <class In, class Out>
 Outcome run_string(int (*fn)(CharsetId, const In **, Out **, uint32_t *), CharsetId charset,
                    const std::string &source, std::optional<uint32_t> room) {
-    const uint32_t r = room.value_or(static_cast<uint32_t>(source.size() * 4 + 8));
-    std::vector<char> buffer(r + kGuard, static_cast<char>(kGuardByte));
+    const uint32_t r = room.value_or(uint32_t(source.size() * 4 + 8));
+    std::vector<char> buffer(r + kGuard, kGuardByte);
     const auto *in = reinterpret_cast<const In *>(source.data());
     auto *out = reinterpret_cast<Out *>(buffer.data());
     Outcome run{};
     run.length = r;
     run.result = fn(charset, &in, &out, &run.length);
-    run.sourceMoved = static_cast<size_t>(reinterpret_cast<const char *>(in) - source.data());
-    run.destinationMoved = static_cast<size_t>(reinterpret_cast<char *>(out) - buffer.data());
-    const size_t end = run.result ? run.length : std::min<size_t>(run.destinationMoved + run.length, r);
-    run.output.assign(buffer.data(), end);
+    run.sourceMoved = size_t(reinterpret_cast<const char *>(in) - source.data());
+    run.destinationMoved = size_t(reinterpret_cast<char *>(out) - buffer.data());
+    run.output.assign(buffer.data(),
+                      run.result ? run.length : std::min<size_t>(run.destinationMoved + run.length, r));
     run.guardIntact = guard_intact(buffer, r);
     return run;
 }
 
-// StringFromCharsetToUnicode over text, its terminator appended (a 0 unit
-// for the 16-bit charsets, else a NUL). Default room: plenty.
-inline Outcome to_unicode(CharsetId charset, const std::string &text, std::optional<uint32_t> room = {}) {
-    const bool unitText =
-        charset == CHARSET_UTF16 || charset == CHARSET_UTF16LE || charset == CHARSET_UTF16BE;
-    return run_string(StringFromCharsetToUnicode, charset, text + std::string(unitText ? 2 : 1, '\0'), room);
+inline bool is_utf16(CharsetId c) {
+    return c == CHARSET_UTF16 || c == CHARSET_UTF16LE || c == CHARSET_UTF16BE;
 }
 
-// StringFromUnicodeToCharset over units, a 0 unit appended.
+// StringFromCharsetToUnicode over text and its terminator (a 0 unit for the
+// 16-bit charsets). Default room: plenty.
+inline Outcome to_unicode(CharsetId charset, const std::string &text, std::optional<uint32_t> room = {}) {
+    return run_string(StringFromCharsetToUnicode, charset,
+                      text + std::string(is_utf16(charset) ? 2 : 1, '\0'), room);
+}
 inline Outcome from_unicode(CharsetId charset, const std::u16string &units,
                             std::optional<uint32_t> room = {}) {
     return run_string(StringFromUnicodeToCharset, charset, as_bytes(units + u'\0'), room);
+}
+
+// FromCharsetToUnicode on one character.
+struct Char {
+    int result;
+    uint16_t unit;
+    size_t moved;
+};
+inline Char decode_char(CharsetId charset, const char *source) {
+    const char *p = source;
+    uint16_t unit = 0;
+    uint32_t length = 0;
+    const int result = FromCharsetToUnicode(charset, &p, &unit, &length);
+    if (result) {
+        EXPECT_EQ(length, 2u);
+    }
+    return {result, unit, size_t(p - source)};
+}
+// FromUnicodeToCharset on one unit; nullopt on failure.
+inline std::optional<std::string> encode_char(CharsetId charset, uint16_t unit) {
+    char out[8], *q = out;
+    if (!FromUnicodeToCharset(charset, unit, &q)) return std::nullopt;
+    return std::string(out, q);
 }
 
 }  // namespace enginetest
