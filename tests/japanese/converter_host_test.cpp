@@ -1,7 +1,6 @@
 // The EUC-JP converters as the host sees them: the prompt when the platform
-// lacks one, silence on stderr, how often iconv runs, and the Mem_alloc
-// buffer of StringToCurrentEncoding. The test supplies the host services and
-// stands between the library and glibc's iconv_open and iconv.
+// lacks one, silence on stderr, iconv calls per character, and the Mem_alloc
+// buffer of StringToCurrentEncoding. The test supplies the host services.
 #include <dlfcn.h>
 #include <gtest/gtest.h>
 #include <iconv.h>
@@ -15,8 +14,7 @@
 #include "textconv.h"
 
 namespace {
-bool eucjpMissing = false;
-bool memoryExhausted = false;
+bool eucjpMissing = false, memoryExhausted = false;
 int promptAnswer = 1;
 int iconvCalls = 0, memAllocs = 0, memFrees = 0;
 std::vector<std::string> prompts;
@@ -60,9 +58,8 @@ int32_t GetiStringID(const char *key, const StringIDEntry *table) {
 void *memmove_soc(void *d, const void *s, uint32_t n) { return std::memmove(d, s, n); }
 }
 
-// The user accepts to go on without EUC-JP: asked once, then every
-// non-ASCII character fails quietly, row 13 included (the table is consulted
-// only once the converter is open).
+// Going on without EUC-JP: asked once per direction, then every non-ASCII
+// character fails quietly, row 13 included.
 TEST(EucJpConverterMissing, AcceptedFailsQuietly) {
     eucjpMissing = true;
     testing::internal::CaptureStderr();
@@ -97,8 +94,8 @@ TEST(EucJpConverterMissing, DeclinedEndsTheProcess) {
                 testing::ExitedWithCode(1), "");
 }
 
-// At most one iconv call per character, plus the throwaway of the first use;
-// a character seen before, and row 13, need none.
+// One iconv call per new character plus the first use's throwaway; none for
+// a character seen before or for row 13.
 TEST(EucJpConverter, IconvCallsPerCharacter) {
     const uint8_t hiragana[2] = {4, 2}, other[2] = {4, 4}, row13[2] = {13, 1};
     uint16_t unit;
@@ -118,9 +115,8 @@ TEST(EucJpConverter, IconvCallsPerCharacter) {
     EXPECT_TRUE(prompts.empty());
 }
 
-// StringToCurrentEncoding on an EUC-JP device (a real ja_JP EUC-JP locale
-// through LOCPATH): a new buffer holding glibc's conversion, or, for an
-// invalid byte or no memory, the input itself and no buffer left behind.
+// On an EUC-JP device (a real locale through LOCPATH): a new buffer with
+// glibc's conversion, or the input itself and no buffer left behind.
 TEST(StringToCurrentEncoding, EucJpDevice) {
     setenv("LC_ALL", "ja_JP.eucJP", 1);  // glibc reports "EUC-JP"; the name says "eucJP"
     ASSERT_EQ(LocalEncoding(), CHARSET_EUCJP);
@@ -131,13 +127,11 @@ TEST(StringToCurrentEncoding, EucJpDevice) {
         EXPECT_EQ(std::string(result), *testsupport::iconv_convert("EUC-JP", "SJIS", sjis));
         Mem_free(1, result);
     }
-    const char *bad = "\x82\xA0\t";
-    EXPECT_EQ(StringToCurrentEncoding(bad, &result), 0);
-    EXPECT_EQ(result, bad);
-    memoryExhausted = true;
-    const char *good = "\x82\xA0";
-    EXPECT_EQ(StringToCurrentEncoding(good, &result), 0);
-    EXPECT_EQ(result, good);
+    for (const char *refused : {"\x82\xA0\t", "\x82\xA0"}) {  // an invalid byte, then no memory
+        EXPECT_EQ(StringToCurrentEncoding(refused, &result), 0);
+        EXPECT_EQ(result, refused);
+        memoryExhausted = true;
+    }
     EXPECT_EQ(memAllocs, 4);
     EXPECT_EQ(memFrees, 4);
 }

@@ -1,5 +1,5 @@
-// Helpers for the Japanese tests: a kept glibc converter as oracle for one
-// character at a time, strings that end at an unreadable page, corpus pieces.
+// Japanese test helpers: a kept glibc converter as oracle, strings ending at
+// an unreadable page, corpus pieces.
 #pragma once
 
 #include <iconv.h>
@@ -27,11 +27,11 @@ class Oracle {
         out.resize(out.size() - ol);
         return out;
     }
-    // One character to one host-order UTF-16 unit (oracle opened to "UTF-16LE").
+    // One character to one UTF-16 unit (oracle opened to "UTF-16LE").
     std::optional<char16_t> unit(const std::string &in) {
         auto out = (*this)(in);
-        if (!out || out->size() != 2) return std::nullopt;
         char16_t u;
+        if (!out || out->size() != 2) return std::nullopt;
         std::memcpy(&u, out->data(), 2);
         return u;
     }
@@ -40,13 +40,12 @@ class Oracle {
     iconv_t cd_;
 };
 
-// A copy of text and its terminator placed so that the terminator is the last
-// readable byte before a PROT_NONE page: reading past it faults.
+// A copy of text whose terminator is the last byte before a PROT_NONE page.
 class Guarded {
   public:
     explicit Guarded(const std::string &text) {
         const size_t page = sysconf(_SC_PAGESIZE);
-        size_ = (text.size() + 1 + page - 1) / page * page + page;
+        size_ = (text.size() + page) / page * page + page;
         base_ = static_cast<char *>(
             mmap(nullptr, size_, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0));
         mprotect(base_ + size_ - page, page, PROT_NONE);
@@ -57,39 +56,21 @@ class Guarded {
     const char *c_str() const { return str_; }
 
   private:
-    char *base_;
-    char *str_;
+    char *base_, *str_;
     size_t size_;
 };
 
-// The pieces of text between control characters (0x00..0x1F, 0x7F), which
-// Shift-JIS conversions here treat as invalid.
+// The pieces of text between control characters (invalid in Shift-JIS here).
 inline std::vector<std::string> split_on_controls(const std::string &text) {
     std::vector<std::string> pieces(1);
     for (unsigned char c : text) {
-        if (c < 0x20 || c == 0x7F) {
-            if (!pieces.back().empty()) pieces.emplace_back();
-        } else {
+        if (c >= 0x20 && c != 0x7F)
             pieces.back() += static_cast<char>(c);
-        }
+        else if (!pieces.back().empty())
+            pieces.emplace_back();
     }
     if (pieces.back().empty()) pieces.pop_back();
     return pieces;
-}
-
-inline std::string utf8_of(char16_t u) {
-    std::string s;
-    if (u < 0x80) {
-        s += static_cast<char>(u);
-    } else if (u < 0x800) {
-        s += static_cast<char>(0xC0 | (u >> 6));
-        s += static_cast<char>(0x80 | (u & 0x3F));
-    } else {
-        s += static_cast<char>(0xE0 | (u >> 12));
-        s += static_cast<char>(0x80 | ((u >> 6) & 0x3F));
-        s += static_cast<char>(0x80 | (u & 0x3F));
-    }
-    return s;
 }
 
 }  // namespace jptest
