@@ -9,13 +9,14 @@
 #include <cstring>
 #include <optional>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include "textconv.h"
 
 namespace enginetest {
 
-// glibc iconv, reset before every conversion.
+// glibc iconv, reset before every conversion; nullopt when it rejects.
 class Oracle {
   public:
     Oracle(const char *to, const char *from) : cd_(iconv_open(to, from)) {}
@@ -30,8 +31,7 @@ class Oracle {
         if (iconv(cd_, &ip, &il, &op, &ol) == size_t(-1) ||
             iconv(cd_, nullptr, nullptr, &op, &ol) == size_t(-1))
             return std::nullopt;
-        out.resize(out.size() - ol);
-        return out;
+        return out.substr(0, out.size() - ol);
     }
 
   private:
@@ -46,10 +46,10 @@ inline std::u16string as_units(const std::string &bytes) {
 inline std::string as_bytes(const std::u16string &units) {
     return std::string(reinterpret_cast<const char *>(units.data()), units.size() * 2);
 }
+inline std::u16string z(std::u16string units) { return units + u'\0'; }  // with its terminator
 
 constexpr size_t kGuard = 16;
 constexpr char kGuardByte = '\xA5';
-
 inline bool guard_intact(const std::vector<char> &buffer, size_t room) {
     return std::all_of(buffer.begin() + room, buffer.end(), [](char c) { return c == kGuardByte; });
 }
@@ -88,31 +88,25 @@ inline bool is_utf16(CharsetId c) {
     return c == CHARSET_UTF16 || c == CHARSET_UTF16LE || c == CHARSET_UTF16BE;
 }
 
-// StringFromCharsetToUnicode over text and its terminator (a 0 unit for the
-// 16-bit charsets). Default room: plenty.
+// The string functions over text and its terminator (a 0 unit for 16-bit
+// text). Default room: plenty.
 inline Outcome to_unicode(CharsetId charset, const std::string &text, std::optional<uint32_t> room = {}) {
     return run_string(StringFromCharsetToUnicode, charset,
                       text + std::string(is_utf16(charset) ? 2 : 1, '\0'), room);
 }
 inline Outcome from_unicode(CharsetId charset, const std::u16string &units,
                             std::optional<uint32_t> room = {}) {
-    return run_string(StringFromUnicodeToCharset, charset, as_bytes(units + u'\0'), room);
+    return run_string(StringFromUnicodeToCharset, charset, as_bytes(z(units)), room);
 }
 
-// FromCharsetToUnicode on one character.
-struct Char {
-    int result;
-    uint16_t unit;
-    size_t moved;
-};
+// FromCharsetToUnicode on one character: result, unit, bytes moved.
+using Char = std::tuple<int, uint16_t, size_t>;
 inline Char decode_char(CharsetId charset, const char *source) {
     const char *p = source;
     uint16_t unit = 0;
     uint32_t length = 0;
     const int result = FromCharsetToUnicode(charset, &p, &unit, &length);
-    if (result) {
-        EXPECT_EQ(length, 2u);
-    }
+    EXPECT_TRUE(!result || length == 2);
     return {result, unit, size_t(p - source)};
 }
 // FromUnicodeToCharset on one unit; nullopt on failure.

@@ -1,5 +1,5 @@
 // A platform under the test's control: iconv_open and iconv interposed over
-// glibc's, and the host services defined here, watched.
+// glibc's, and the host services, watched.
 #pragma once
 
 #include <iconv.h>
@@ -10,25 +10,16 @@
 
 namespace shim {
 
-// Names iconv_open refuses, as if the platform lacked them.
-extern std::set<std::string> missingNames;
-// When set, every converter to "UTF-16" puts the mark FF FE in front of the
-// output of each iconv call that writes or runs out of room (glibc marks
-// only the first output of a converter's life).
-extern bool markEveryCall;
-
 struct IconvCall {
     iconv_t cd;
     size_t inBytes;
-    size_t room;
 };
-extern std::vector<std::string> opened;  // "to<-from", every iconv_open
-extern std::vector<IconvCall> calls;     // every iconv call with an input
-
-// Host services.
-extern std::vector<std::string> prompts;  // "from->to"
-extern int promptAnswer;
-extern bool mallocFails;
-extern int mallocs, frees;
+extern std::set<std::string> missingNames;  // names iconv_open refuses
+// Converters to "UTF-16" put FF FE in front of the output of every call that
+// writes or runs out of room (glibc marks only a converter's first output).
+extern bool markEveryCall, mallocFails;
+extern std::vector<std::string> opened, prompts;  // "to<-from" per iconv_open; "from->to"
+extern std::vector<IconvCall> calls;              // every iconv call with an input
+extern int promptAnswer, mallocs, frees;
 
 }  // namespace shim
