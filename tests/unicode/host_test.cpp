@@ -46,41 +46,29 @@ int32_t GetiStringID(const char *, const StringIDEntry *table) {
 void *memmove_soc(void *d, const void *s, uint32_t n) { return std::memmove(d, s, n); }
 }
 
-namespace {
-
-TEST(StringListFromUTF8toUTF16, NullBlockFromTheHostFailsAndChangesNothing) {
-    for (std::string in : {std::string("ab\0c\0", 5), std::string()}) {
+// A null block fails and changes nothing; a block holds the worst cases (all
+// stray bytes, a last string without its NUL, single-byte strings) and is
+// released when the conversion fails.
+TEST(StringListFromUTF8toUTF16, HostBlocks) {
+    using namespace std::string_literals;
+    for (std::string in : {"ab\0c\0"s, ""s}) {
         failNext = true;
         char *list = in.data();
         uint32_t len = static_cast<uint32_t>(in.size());
         EXPECT_EQ(StringListFromUTF8toUTF16(&list, &len), 0);
-        EXPECT_EQ(list, in.data());
-        EXPECT_EQ(len, in.size());
+        EXPECT_TRUE(list == in.data() && len == in.size());
     }
     failNext = false;
-}
-
-TEST(StringListFromUTF8toUTF16, BlockHoldsTheWorstCaseAndTheLastTerminator) {
-    // Worst cases for the block: all stray bytes (one unit each), a last
-    // string without its NUL, single-byte strings.
     for (std::string in :
-         {std::string("\x80\x80\x80"), std::string("abc"), std::string("a\0b\0c", 5),
-          std::string("a\0b\0c\0", 6), std::string("\xF0\x9F\x98\x80"), std::string("\xC3\xA9\xE3")}) {
+         {"\x80\x80\x80"s, "abc"s, "a\0b\0c"s, "a\0b\0c\0"s, "\xF0\x9F\x98\x80"s, "\xC3\xA9\xE3"s}) {
         char *list = in.data();
         uint32_t len = static_cast<uint32_t>(in.size());
-        int ok = StringListFromUTF8toUTF16(&list, &len);
-        if (static_cast<uint8_t>(in.back()) == 0xE3) {
-            EXPECT_EQ(ok, 0);
-            EXPECT_EQ(liveBlocks, 0) << "block not released on failure";
-            continue;
-        }
-        ASSERT_EQ(ok, 1);
+        const int ok = StringListFromUTF8toUTF16(&list, &len);
+        EXPECT_EQ(ok, in.back() != '\xE3');
+        if (!ok) continue;
         EXPECT_LE(len, lastSize);
-        const auto *units = reinterpret_cast<const uint16_t *>(list);
-        EXPECT_EQ(units[len / 2 - 1], 0) << "last terminator missing";
+        EXPECT_EQ(reinterpret_cast<const uint16_t *>(list)[len / 2 - 1], 0) << "last terminator missing";
         HostFree(list);
     }
     EXPECT_EQ(liveBlocks, 0);
 }
-
-}  // namespace
