@@ -8,45 +8,27 @@
 #include <string>
 
 #include "charset_agreement.h"
+#include "test_support.h"
 #include "textconv.h"
 
-namespace {
-
-int rows(const StringIDEntry *table) {
-    int n = 0;
-    while (table[n].name) ++n;
-    return n;
-}
-
-std::string show(const std::string &bytes) {
-    std::string s;
-    char buf[4];
-    for (unsigned char c : bytes) snprintf(buf, sizeof buf, "%02X", c), s += buf;
-    return s;
-}
-
-}  // namespace
-
 TEST(NameTables, ShapeAndDefaults) {
-    EXPECT_EQ(rows(charsets), 30);
-    EXPECT_EQ(rows(locales), 11);
-    EXPECT_EQ(rows(languages), 1);
-    EXPECT_EQ(charsets[rows(charsets)].id, CHARSET_NONE);
-    EXPECT_EQ(locales[rows(locales)].id, CHARSET_NONE);
-    EXPECT_EQ(languages[rows(languages)].id, CHARSET_LATIN1);
-    for (const StringIDEntry *table : {charsets, locales, languages}) {
+    const std::pair<const StringIDEntry *, CharsetId> tables[] = {
+        {charsets, CHARSET_NONE}, {locales, CHARSET_NONE}, {languages, CHARSET_LATIN1}};
+    for (auto [table, fallback] : tables) {
         std::set<std::string> seen;
-        for (const StringIDEntry *row = table; row->name; ++row) {
+        const StringIDEntry *row = table;
+        for (; row->name; ++row) {
             EXPECT_TRUE(seen.insert(row->name).second) << "duplicate " << row->name;
             EXPECT_GT(row->id, CHARSET_NONE) << row->name;
             EXPECT_LT(row->id, CHARSET_COUNT) << row->name;
         }
+        EXPECT_EQ(row->id, fallback);
+        EXPECT_GE(seen.size(), 1u);
     }
 }
 
 // Where glibc knows a charset name of the table, its converter decodes every
-// short sequence as the registry's converter for the row's id does: the table
-// sends each name to the right charset.
+// short sequence as the registry's converter for the row's id does.
 TEST(NameTables, CharsetNamesAgreeWithRegistryConverters) {
     int checked = 0;
     for (const StringIDEntry *row = charsets; row->name; ++row) {
@@ -59,99 +41,71 @@ TEST(NameTables, CharsetNamesAgreeWithRegistryConverters) {
         SCOPED_TRACE(std::string(row->name) + " vs " + registryName);
         ++checked;
         EXPECT_GT(agreement->compared, 200u);
-        EXPECT_TRUE(agreement->differing.empty())
-            << agreement->differing.size() << " differ, first " << show(agreement->differing.front());
+        EXPECT_TRUE(agreement->differing.empty()) << agreement->differing.size() << " differ, first "
+                                                  << testsupport::hex(agreement->differing.front());
     }
     EXPECT_GE(checked, 20);
 }
 
-// The charset part (after the last ".") decides first, whatever precedes it.
-TEST(FindCharsetFrom, EveryCharsetRowAfterTheLastDot) {
+TEST(FindCharsetFrom, EveryRowOfTheTables) {
+    // The charset part (after the last ".") decides first, whatever precedes
+    // it; without a "." the same word is neither a locale nor a language.
     for (const StringIDEntry *row = charsets; row->name; ++row) {
-        for (const char *prefix : {"xx_XX.", "fr_FR.", "ar_EG.", "ja_JP.old.", "."}) {
-            std::string name = std::string(prefix) + row->name;
-            EXPECT_EQ(find_charset_from(name.c_str()), row->id) << name;
-        }
-        // Without a "." the same word is neither a locale nor a language.
+        for (const char *prefix : {"xx_XX.", "fr_FR.", "ar_EG.", "ja_JP.old.", "."})
+            EXPECT_EQ(find_charset_from((prefix + std::string(row->name)).c_str()), row->id)
+                << prefix << row->name;
         EXPECT_EQ(find_charset_from(row->name), CHARSET_LATIN1) << row->name;
     }
-}
-
-// Whole names decide next; only an exact match counts.
-TEST(FindCharsetFrom, EveryLocaleRowAsAWholeName) {
+    // Whole locale names next, exact matches only: with a charset part found
+    // in no table the language decides.
     for (const StringIDEntry *row = locales; row->name; ++row) {
         EXPECT_EQ(find_charset_from(row->name), row->id) << row->name;
-        // A charset part found in no table leaves the whole name, which no
-        // longer matches: the language decides.
-        std::string dotted = std::string(row->name) + ".bogus";
         const CharsetId byLanguage =
             std::strncmp(row->name, "ar_", 3) == 0 ? CHARSET_ISO8859_6 : CHARSET_LATIN1;
-        EXPECT_EQ(find_charset_from(dotted.c_str()), byLanguage) << dotted;
+        EXPECT_EQ(find_charset_from((row->name + std::string(".bogus")).c_str()), byLanguage) << row->name;
     }
 }
 
 TEST(FindCharsetFrom, Cases) {
-    const struct {
-        const char *name;
-        CharsetId id;
-    } cases[] = {
-        {"ja_JP.SJIS", CHARSET_SJIS},
-        {"ja_JP.eucJP", CHARSET_EUCJP},
-        {"ja_JP", CHARSET_EUCJP},
-        {"Ja_JP", CHARSET_SJIS},
-        {"JA_JP", CHARSET_LATIN1},
-        {"ja_JP.sjis", CHARSET_LATIN1},
-        {"zh_TW", CHARSET_BIG5},
-        {"zh_TW.Big5", CHARSET_LATIN1},
-        {"zh_CN.GB18030", CHARSET_GB18030},
-        {"ar_EG", CHARSET_ISO8859_6},
-        {"ar", CHARSET_ISO8859_6},
-        {"ar_IN", CHARSET_UTF8},
-        {"ar_SA.ISO-8859-1", CHARSET_ISO8859_6},
-        {"ar_EG.UTF-8", CHARSET_UTF8},
-        {"ar.bogus_x", CHARSET_LATIN1},
-        {"arabic", CHARSET_LATIN1},
-        {"fr_FR", CHARSET_LATIN1},
-        {"POSIX", CHARSET_LATIN1},
-        {"C", CHARSET_LATIN1},
-        {"", CHARSET_LATIN1},
-        {".", CHARSET_LATIN1},
-        {"ja_JP.", CHARSET_LATIN1},
-        {"_ar", CHARSET_LATIN1},
-        {"a.UTF8.b", CHARSET_LATIN1},
-        {"b.x.UTF8", CHARSET_UTF8},
-        {"en_US.utf8", CHARSET_LATIN1},
-    };
-    for (const auto &c : cases) EXPECT_EQ(find_charset_from(c.name), c.id) << '"' << c.name << '"';
+    const std::pair<const char *, CharsetId> cases[] = {{"Ja_JP", CHARSET_SJIS},
+                                                        {"JA_JP", CHARSET_LATIN1},
+                                                        {"ja_JP.sjis", CHARSET_LATIN1},
+                                                        {"zh_TW.Big5", CHARSET_LATIN1},
+                                                        {"ar", CHARSET_ISO8859_6},
+                                                        {"ar_IN", CHARSET_UTF8},
+                                                        {"ar_SA.ISO-8859-1", CHARSET_ISO8859_6},
+                                                        {"ar.bogus_x", CHARSET_LATIN1},
+                                                        {"arabic", CHARSET_LATIN1},
+                                                        {"POSIX", CHARSET_LATIN1},
+                                                        {"C", CHARSET_LATIN1},
+                                                        {"", CHARSET_LATIN1},
+                                                        {".", CHARSET_LATIN1},
+                                                        {"ja_JP.", CHARSET_LATIN1},
+                                                        {"_ar", CHARSET_LATIN1},
+                                                        {"a.UTF8.b", CHARSET_LATIN1},
+                                                        {"b.x.UTF8", CHARSET_UTF8},
+                                                        {"en_US.utf8", CHARSET_LATIN1}};
+    for (const auto &[name, id] : cases) EXPECT_EQ(find_charset_from(name), id) << '"' << name << '"';
 }
 
-TEST(LocaleNameParts, CharsetPartPointsIntoTheName) {
+TEST(LocaleNameParts, CharsetPartAndLanguage) {
+    // The charset part points into the name (-1: no "."); the language is a
+    // fresh copy cut at the first "_".
     const struct {
         const char *name;
-        int offset;  // -1: no "."
-    } cases[] = {{"en_US.UTF-8", 6}, {"a.b.c", 4}, {"abc.", 4}, {".", 1}, {"abc", -1}, {"", -1}};
-    for (const auto &c : cases) {
-        const char *part = get_charset_from_locale(c.name);
-        if (c.offset < 0)
-            EXPECT_EQ(part, nullptr) << c.name;
-        else
-            EXPECT_EQ(part, c.name + c.offset) << c.name;
-    }
-    EXPECT_EQ(get_charset_from_locale(nullptr), nullptr);
-}
-
-TEST(LocaleNameParts, LanguageIsAFreshCopyCutAtTheFirstUnderscore) {
-    const struct {
-        const char *name;
+        int dot;
         const char *language;
-    } cases[] = {{"ar_EG.UTF-8", "ar"}, {"ar", "ar"}, {"a_b_c", "a"}, {"_x", ""}, {"", ""},
-                 {"en.x_y", "en.x"}};
+    } cases[] = {{"en_US.UTF-8", 6, "en"}, {"a.b.c", 4, "a.b.c"}, {"abc.", 4, "abc."}, {".", 1, "."},
+                 {"abc", -1, "abc"},       {"", -1, ""},          {"a_b_c", -1, "a"},  {"_x", -1, ""},
+                 {"en.x_y", 3, "en.x"}};
     for (const auto &c : cases) {
+        EXPECT_EQ(get_charset_from_locale(c.name), c.dot < 0 ? nullptr : c.name + c.dot) << c.name;
         char *language = get_language_from_locale(c.name);
         ASSERT_NE(language, nullptr) << c.name;
         EXPECT_STREQ(language, c.language) << c.name;
         EXPECT_NE(static_cast<const char *>(language), c.name);
         std::free(language);
     }
+    EXPECT_EQ(get_charset_from_locale(nullptr), nullptr);
     EXPECT_EQ(get_language_from_locale(nullptr), nullptr);
 }

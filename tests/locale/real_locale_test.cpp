@@ -1,7 +1,6 @@
 // The detection under real glibc locales (reached through LOCPATH), with the
-// reference host's lookup. glibc reports codesets such as "EUC-JP" and
-// "ISO-8859-1" that the charsets table does not hold, so for those the locale
-// name and the tables decide.
+// reference host's lookup. glibc reports codesets such as "EUC-JP" that the
+// charsets table does not hold; for those the locale name and tables decide.
 #include <gtest/gtest.h>
 #include <langinfo.h>
 
@@ -18,24 +17,21 @@ namespace {
 struct RealCase {
     const char *lang;
     CharsetId id;
-    // The locale's codeset is the charset the id names: glibc's converters for
-    // both decode every short sequence alike.
-    bool sameCharset;
+    bool sameCharset;              // glibc's converters for the codeset and the id decode alike
     const char *loaded = nullptr;  // the name glibc keeps, when not lang
 };
 
 void PrintTo(const RealCase &c, std::ostream *os) { *os << c.lang; }
 
-std::string label(const char *lang) {
-    std::string s;
-    for (const char *p = lang; *p; ++p) s += std::isalnum(static_cast<unsigned char>(*p)) ? *p : '_';
-    return s;
-}
-
 void start_with_lang(const char *lang) {
     unsetenv("LC_ALL");
     unsetenv("LC_CTYPE");
     setenv("LANG", lang, 1);
+}
+
+std::string env(const char *name) {
+    const char *value = std::getenv(name);
+    return value ? value : "null";
 }
 
 class RealLocale : public ::testing::TestWithParam<RealCase> {};
@@ -45,12 +41,11 @@ TEST_P(RealLocale, LocalEncoding) {
     ASSERT_NE(std::getenv("LOCPATH"), nullptr) << "run through ctest: the locales come from a fixture";
     start_with_lang(c.lang);
     const CharsetId id = LocalEncoding();
-    // The locale really loaded: glibc keeps the name it was given.
     ASSERT_STREQ(std::setlocale(LC_CTYPE, nullptr), c.loaded ? c.loaded : c.lang) << "locale not built?";
     EXPECT_EQ(id, c.id) << "codeset " << nl_langinfo(CODESET);
     EXPECT_EQ(LocalEncoding(), id);
-    EXPECT_STREQ(std::getenv("LANG"), c.lang);
-    EXPECT_EQ(std::getenv("LC_ALL"), nullptr);
+    EXPECT_EQ(env("LANG"), c.lang);
+    EXPECT_EQ(env("LC_ALL"), "null");
     if (c.sameCharset) {
         auto agreement = localetest::compare_decoders(nl_langinfo(CODESET), charsetConversion[id].iconvName);
         ASSERT_TRUE(agreement.has_value());
@@ -79,7 +74,11 @@ INSTANTIATE_TEST_SUITE_P(
         RealCase{"ar_IN", CHARSET_UTF8, true}, RealCase{"pl_PL", CHARSET_ISO8859_2, true},
         // Charsets the registry lacks: the default.
         RealCase{"tr_TR", CHARSET_LATIN1, false}, RealCase{"ru_RU", CHARSET_LATIN1, false}),
-    [](const ::testing::TestParamInfo<RealCase> &info) { return label(info.param.lang); });
+    [](const ::testing::TestParamInfo<RealCase> &info) {
+        std::string s = info.param.lang;
+        for (char &ch : s) ch = std::isalnum(static_cast<unsigned char>(ch)) ? ch : '_';
+        return s;
+    });
 
 // A locale glibc cannot load leaves the process in "C": the default, and
 // the environment as it was.
@@ -87,7 +86,7 @@ TEST(RealLocaleMissing, GivesTheDefault) {
     start_with_lang("xx_YY.UTF-8");
     EXPECT_EQ(LocalEncoding(), CHARSET_LATIN1);
     EXPECT_STREQ(std::setlocale(LC_CTYPE, nullptr), "C");
-    EXPECT_STREQ(std::getenv("LANG"), "xx_YY.UTF-8");
+    EXPECT_EQ(env("LANG"), "xx_YY.UTF-8");
 }
 
 // With the switch on, a ".utf8" locale is applied again under its canonical
@@ -95,29 +94,29 @@ TEST(RealLocaleMissing, GivesTheDefault) {
 TEST(RealLocaleRewrite, SwitchOn) {
     start_with_lang("en_US.utf8");
     EXPECT_EQ(SetCurrentLocale(1), CHARSET_UTF8);
-    EXPECT_STREQ(std::getenv("LANG"), "en_US.UTF-8");
-    EXPECT_STREQ(std::getenv("LC_ALL"), "en_US.UTF-8");
+    EXPECT_EQ(env("LANG"), "en_US.UTF-8");
+    EXPECT_EQ(env("LC_ALL"), "en_US.UTF-8");
     EXPECT_STREQ(std::setlocale(LC_CTYPE, nullptr), "en_US.UTF-8");
     EXPECT_STREQ(std::setlocale(LC_MESSAGES, nullptr), "en_US.UTF-8");
     EXPECT_STREQ(nl_langinfo(CODESET), "UTF-8");
     EXPECT_EQ(LocalEncoding(), CHARSET_UTF8);
 }
 
+// Off, or set after the first detection: nothing is applied.
 TEST(RealLocaleRewrite, SwitchOff) {
     start_with_lang("en_US.utf8");
     EXPECT_EQ(SetCurrentLocale(0), CHARSET_UTF8);
-    EXPECT_STREQ(std::getenv("LANG"), "en_US.utf8");
-    EXPECT_EQ(std::getenv("LC_ALL"), nullptr);
+    EXPECT_EQ(env("LANG"), "en_US.utf8");
+    EXPECT_EQ(env("LC_ALL"), "null");
     EXPECT_STREQ(std::setlocale(LC_CTYPE, nullptr), "en_US.utf8");
 }
 
-// The switch set after the first detection changes nothing.
 TEST(RealLocaleRewrite, SwitchTooLate) {
     start_with_lang("ar_EG.utf8");
     EXPECT_EQ(LocalEncoding(), CHARSET_UTF8);
     EXPECT_EQ(SetCurrentLocale(1), CHARSET_UTF8);
-    EXPECT_STREQ(std::getenv("LANG"), "ar_EG.utf8");
-    EXPECT_EQ(std::getenv("LC_ALL"), nullptr);
+    EXPECT_EQ(env("LANG"), "ar_EG.utf8");
+    EXPECT_EQ(env("LC_ALL"), "null");
 }
 
 }  // namespace
