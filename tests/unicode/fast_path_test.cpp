@@ -73,19 +73,14 @@ void damage(std::mt19937 &rng, std::string &s, int hits) {
     for (int i = 0; i < hits && !s.empty(); ++i) {
         const size_t at = rng() % s.size();
         const char b = static_cast<char>(bad[rng() % std::size(bad)]);
+        // clang-format off
         switch (rng() % 4) {
-            case 0:
-                s[at] = b;
-                break;
-            case 1:
-                s.insert(at, 1, b);
-                break;
-            case 2:
-                s.erase(at, 1);
-                break;
-            default:
-                s.insert(at, rng() % 2 ? "\xED\xA0\x80" : "\xE0\x80\xAF");
+            case 0: s[at] = b; break;
+            case 1: s.insert(at, 1, b); break;
+            case 2: s.erase(at, 1); break;
+            default: s.insert(at, rng() % 2 ? "\xED\xA0\x80" : "\xE0\x80\xAF");
         }
+        // clang-format on
     }
 }
 
