@@ -74,10 +74,7 @@ TEST(EucJpConverterMissing, AcceptedFailsQuietly) {
     EXPECT_EQ(std::string(utf8, count), "\xEF\xBF\xBF");
     char sjis[8];
     int32_t length = 7;
-    EXPECT_EQ(StringFromEUCJPToSJIS("A\xA4\xA2"
-                                    "B",
-                                    sjis, &length),
-              0);
+    EXPECT_EQ(StringFromEUCJPToSJIS("A\xA4\xA2\x42", sjis, &length), 0);
     EXPECT_STREQ(sjis, "A B");
     EXPECT_EQ(ConvertFromUnicodeToEUCJP(0x2460, sjis), 0);  // the table is not tried either
     EXPECT_EQ(prompts, (std::vector<std::string>{"300 EUC-JP->UTF-16", "300 UTF-16->EUC-JP"}));
@@ -101,8 +98,7 @@ TEST(EucJpConverter, IconvCallsPerCharacter) {
     uint16_t unit;
     ConvertFromJISToUnicode(hiragana, &unit, JIS_FORM_X0208);
     EXPECT_EQ(iconvCalls, 2);
-    ConvertFromJISToUnicode(hiragana, &unit, JIS_FORM_X0208);
-    ConvertFromJISToUnicode(row13, &unit, JIS_FORM_X0208);
+    for (const uint8_t *seen : {hiragana, row13}) ConvertFromJISToUnicode(seen, &unit, JIS_FORM_X0208);
     EXPECT_EQ(iconvCalls, 2);
     ConvertFromJISToUnicode(other, &unit, JIS_FORM_X0208);
     EXPECT_EQ(unit, 0x3044);
