@@ -17,27 +17,19 @@
 namespace {
 
 struct Platform {
-    bool fakeName = false;  // answer setlocale(LC_CTYPE, NULL) with `name`
-    const char *name = nullptr;
-    bool fakeCodeset = false;  // answer nl_langinfo(CODESET) with `codeset`
-    const char *codeset = nullptr;
-    bool failStrdup = false;
+    bool fakeName, fakeCodeset;  // answer setlocale(LC_CTYPE, NULL) and nl_langinfo(CODESET)
+    const char *name, *codeset;
+    bool failStrdup;
 } platform;
 
-std::vector<std::string> calls;
+using Calls = std::vector<std::string>;
+Calls calls;
 
-std::string shown(const char *s) { return s ? std::string(s) : std::string("null"); }
+std::string shown(const char *s) { return s ? s : "null"; }
 
 template <typename Fn>
 Fn next(const char *symbol) {
     return reinterpret_cast<Fn>(dlsym(RTLD_NEXT, symbol));
-}
-
-const char *table_name(const StringIDEntry *table) {
-    if (table == charsets) return "charsets";
-    if (table == locales) return "locales";
-    if (table == languages) return "languages";
-    return "?";
 }
 
 }  // namespace
@@ -72,16 +64,15 @@ int setenv(const char *name, const char *value, int overwrite) noexcept {
 
 char *strdup(const char *s) noexcept {
     calls.push_back("strdup(" + shown(s) + ")");
-    if (platform.failStrdup) return nullptr;
     static auto real = next<char *(*)(const char *)>("strdup");
-    return real(s);
+    return platform.failStrdup ? nullptr : real(s);
 }
 
 // The host's lookup: exact, case-sensitive.
 int32_t GetiStringID(const char *key, const StringIDEntry *table) {
-    calls.push_back("GetiStringID(" + shown(key) + "," + table_name(table) + ")");
-    for (; table->name; ++table)
-        if (key && std::strcmp(key, table->name) == 0) return table->id;
+    const char *name = table == charsets ? "charsets" : table == locales ? "locales" : "languages";
+    calls.push_back("GetiStringID(" + shown(key) + "," + name + ")");
+    while (table->name && !(key && std::strcmp(key, table->name) == 0)) ++table;
     return table->id;
 }
 
@@ -95,28 +86,22 @@ void *memmove_soc(void *d, const void *s, uint32_t n) { return std::memmove(d, s
 
 namespace {
 
-using Calls = std::vector<std::string>;
-
-// The calls every detection begins with.
-const Calls kQueries = {"setlocale(6,)", "setlocale(0,null)", "nl_langinfo(14)"};
+const Calls kQueries = {"setlocale(6,)", "setlocale(0,null)", "nl_langinfo(14)"};  // every detection's start
 
 Calls with(Calls head, const Calls &tail) {
     head.insert(head.end(), tail.begin(), tail.end());
     return head;
 }
-
 Calls apply(const std::string &name) {
     return {"setenv(LANG," + name + ",1)", "setenv(LC_ALL," + name + ",1)", "setlocale(6,)"};
 }
 
-// Each test starts from a clean environment with the platform simulated as
-// it says; the library's state is fresh because every test is a process.
+// A clean environment per test; the library's state is fresh because every
+// test is a process.
 class Detection : public ::testing::Test {
   protected:
     void SetUp() override {
-        unsetenv("LC_ALL");
-        unsetenv("LC_CTYPE");
-        unsetenv("LANG");
+        for (const char *name : {"LC_ALL", "LC_CTYPE", "LANG"}) unsetenv(name);
         calls.clear();
     }
     static void simulate(const char *name, const char *codeset) {
@@ -143,45 +128,6 @@ TEST_F(Detection, SecondCallsTouchNothing) {
     EXPECT_EQ(textconv::utf8LocaleRewrite, 0);  // the low byte only
 }
 
-TEST_F(Detection, CodesetInTheTableDecidesWhateverTheName) {
-    simulate("ko_KR.UTF-8", "eucJP");
-    EXPECT_EQ(LocalEncoding(), CHARSET_EUCJP);
-    EXPECT_EQ(calls, with(kQueries, {"GetiStringID(eucJP,charsets)"}));
-}
-
-TEST_F(Detection, NothingNamesALocale) {
-    simulate(nullptr, nullptr);
-    EXPECT_EQ(LocalEncoding(), CHARSET_LATIN1);
-    EXPECT_EQ(calls, with(kQueries, with({"getenv(LANG)"}, apply("en_US.ISO8859-1"))));
-    EXPECT_EQ(env("LANG"), "en_US.ISO8859-1");
-    EXPECT_EQ(env("LC_ALL"), "en_US.ISO8859-1");
-    calls.clear();
-    EXPECT_EQ(LocalEncoding(), CHARSET_LATIN1);
-    EXPECT_EQ(calls, Calls{});
-}
-
-TEST_F(Detection, NoLocaleNameFallsBackToLang) {
-    setenv("LANG", "zh_TW", 1);
-    calls.clear();
-    simulate(nullptr, nullptr);
-    EXPECT_EQ(LocalEncoding(), CHARSET_BIG5);
-    EXPECT_EQ(calls, with(kQueries, {"getenv(LANG)", "GetiStringID(zh_TW,locales)"}));
-    EXPECT_EQ(env("LC_ALL"), "null");
-}
-
-TEST_F(Detection, UnknownCodesetLeavesItToTheName) {
-    simulate("ja_JP.SJIS", "SHIFT_JIS");
-    EXPECT_EQ(LocalEncoding(), CHARSET_SJIS);
-    EXPECT_EQ(calls, with(kQueries, {"GetiStringID(SHIFT_JIS,charsets)", "GetiStringID(SJIS,charsets)"}));
-}
-
-TEST_F(Detection, UnknownCodesetAndNameLeaveItToTheLanguage) {
-    simulate("ar_EG", "ISO-8859-1");
-    EXPECT_EQ(LocalEncoding(), CHARSET_ISO8859_6);
-    EXPECT_EQ(calls, with(kQueries, {"GetiStringID(ISO-8859-1,charsets)", "GetiStringID(ar_EG,locales)",
-                                     "strdup(ar_EG)", "GetiStringID(ar,languages)"}));
-}
-
 // A failed copy of the name must not reach the host as a null key nor crash:
 // the language matches nothing and the default stands.
 TEST_F(Detection, FailedLanguageCopyGivesTheDefault) {
@@ -198,61 +144,99 @@ TEST_F(Detection, NullNameAsksTheHostNothing) {
     EXPECT_EQ(calls, Calls{});
 }
 
-// The ".UTF8" rewrite, with the codeset reporting UTF-8.
-struct RewriteCase {
-    const char *label;
-    std::string name;  // the locale name; "null" for none
-    uint32_t rewrite;  // the switch, through SetCurrentLocale; ~0u: LocalEncoding alone
+// One detection: LANG beforehand, the platform's answers, the switch
+// (~0u: LocalEncoding alone), the result, the lookups after the queries, and
+// the name then set in LANG and LC_ALL ("" when untouched).
+struct Case {
+    const char *label, *lang;
+    std::string name;  // "null" for none
+    const char *codeset;
+    uint32_t rewrite;
     CharsetId id;
-    std::string applied;  // the name set in LANG and LC_ALL; "" when untouched
+    Calls lookups;
+    std::string applied;
 };
 
-void PrintTo(const RewriteCase &c, std::ostream *os) { *os << c.label; }
+void PrintTo(const Case &c, std::ostream *os) { *os << c.label; }
+
+class Decides : public Detection, public ::testing::WithParamInterface<Case> {};
+
+TEST_P(Decides, TheLocalEncoding) {
+    const Case &c = GetParam();
+    if (c.lang) setenv("LANG", c.lang, 1);
+    calls.clear();
+    simulate(c.name == "null" ? nullptr : c.name.c_str(), c.codeset);
+    EXPECT_EQ(c.rewrite == ~0u ? LocalEncoding() : SetCurrentLocale(c.rewrite), c.id);
+    EXPECT_EQ(textconv::currentLocalEncoding, c.id);
+    EXPECT_EQ(calls, with(with(kQueries, c.lookups), c.applied.empty() ? Calls{} : apply(c.applied)));
+    EXPECT_EQ(env("LANG"), c.applied.empty() ? shown(c.lang) : c.applied);
+    EXPECT_EQ(env("LC_ALL"), c.applied.empty() ? "null" : c.applied);
+}
 
 std::string long_name(size_t length, const char *suffix) {
     return std::string(length - std::strlen(suffix), 'x') + suffix;
 }
 
-class Utf8Rewrite : public Detection, public ::testing::WithParamInterface<RewriteCase> {};
-
-TEST_P(Utf8Rewrite, AppliesTheCanonicalName) {
-    const RewriteCase &c = GetParam();
-    setenv("LANG", "before", 1);
-    calls.clear();
-    simulate(c.name == "null" ? nullptr : c.name.c_str(), "UTF-8");
-    const CharsetId id = c.rewrite == ~0u ? LocalEncoding() : SetCurrentLocale(c.rewrite);
-    EXPECT_EQ(id, c.id);
-    EXPECT_EQ(textconv::currentLocalEncoding, c.id);
-    const Calls base = with(kQueries, {"GetiStringID(UTF-8,charsets)"});
-    if (c.applied.empty()) {
-        EXPECT_EQ(calls, base);
-        EXPECT_EQ(env("LANG"), "before");
-        EXPECT_EQ(env("LC_ALL"), "null");
-    } else {
-        EXPECT_EQ(calls, with(base, apply(c.applied)));
-        EXPECT_EQ(env("LANG"), c.applied);
-        EXPECT_EQ(env("LC_ALL"), c.applied);
-    }
+Case rewrite(const char *label, std::string name, uint32_t rewrite, std::string applied = "",
+             CharsetId id = CHARSET_UTF8) {
+    return {label, "before", name, "UTF-8", rewrite, id, {"GetiStringID(UTF-8,charsets)"}, applied};
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Cases, Utf8Rewrite,
+    Cases, Decides,
     ::testing::Values(
-        RewriteCase{"On", "en_US.utf8", 1, CHARSET_UTF8, "en_US.UTF-8"},
-        RewriteCase{"AnyCase", "de_DE.uTf8", 1, CHARSET_UTF8, "de_DE.UTF-8"},
-        RewriteCase{"AnyNonZeroLowByte", "en_US.UTF8", 0x1FF, CHARSET_UTF8, "en_US.UTF-8"},
-        RewriteCase{"SixCharacters", "x.utf8", 1, CHARSET_UTF8, "x.UTF-8"},
-        RewriteCase{"Off", "en_US.utf8", 0, CHARSET_UTF8, ""},
-        RewriteCase{"OffByDefault", "en_US.utf8", ~0u, CHARSET_UTF8, ""},
-        RewriteCase{"HighBytesOnly", "en_US.utf8", 0x100, CHARSET_UTF8, ""},
-        RewriteCase{"FiveCharacters", ".UTF8", 1, CHARSET_UTF8, ""},
-        RewriteCase{"AlreadyCanonical", "en_US.UTF-8", 1, CHARSET_UTF8, ""},
-        RewriteCase{"NoDot", "en_USxUTF8", 1, CHARSET_UTF8, ""},
-        RewriteCase{"NoName", "null", 1, CHARSET_UTF8, ""},
+        Case{"CodesetInTheTable",
+             nullptr,
+             "ko_KR.UTF-8",
+             "eucJP",
+             ~0u,
+             CHARSET_EUCJP,
+             {"GetiStringID(eucJP,charsets)"},
+             ""},
+        Case{"UnknownCodesetLeavesItToTheName",
+             nullptr,
+             "ja_JP.SJIS",
+             "SHIFT_JIS",
+             ~0u,
+             CHARSET_SJIS,
+             {"GetiStringID(SHIFT_JIS,charsets)", "GetiStringID(SJIS,charsets)"},
+             ""},
+        Case{"ThenToTheLanguage",
+             nullptr,
+             "ar_EG",
+             "ISO-8859-1",
+             ~0u,
+             CHARSET_ISO8859_6,
+             {"GetiStringID(ISO-8859-1,charsets)", "GetiStringID(ar_EG,locales)", "strdup(ar_EG)",
+              "GetiStringID(ar,languages)"},
+             ""},
+        Case{"NoLocaleNameFallsBackToLang",
+             "zh_TW",
+             "null",
+             nullptr,
+             ~0u,
+             CHARSET_BIG5,
+             {"getenv(LANG)", "GetiStringID(zh_TW,locales)"},
+             ""},
+        Case{"NothingNamesALocale",
+             nullptr,
+             "null",
+             nullptr,
+             ~0u,
+             CHARSET_LATIN1,
+             {"getenv(LANG)"},
+             "en_US.ISO8859-1"},
+        // The ".UTF8" rewrite.
+        rewrite("On", "en_US.utf8", 1, "en_US.UTF-8"), rewrite("AnyCase", "de_DE.uTf8", 1, "de_DE.UTF-8"),
+        rewrite("AnyNonZeroLowByte", "en_US.UTF8", 0x1FF, "en_US.UTF-8"),
+        rewrite("SixCharacters", "x.utf8", 1, "x.UTF-8"), rewrite("Off", "en_US.utf8", 0),
+        rewrite("OffByDefault", "en_US.utf8", ~0u), rewrite("HighBytesOnly", "en_US.utf8", 0x100),
+        rewrite("FiveCharacters", ".UTF8", 1), rewrite("AlreadyCanonical", "en_US.UTF-8", 1),
+        rewrite("NoDot", "en_USxUTF8", 1), rewrite("NoName", "null", 1),
         // The longest name rewritten: 1021 characters become 1022.
-        RewriteCase{"Longest", long_name(1021, ".utf8"), 1, CHARSET_UTF8, long_name(1022, ".UTF-8")},
-        RewriteCase{"TooLong", long_name(1022, ".utf8"), 1, CHARSET_LATIN1, "en_US.ISO8859-1"},
-        RewriteCase{"FarTooLong", long_name(100000, ".UTF8"), 1, CHARSET_LATIN1, "en_US.ISO8859-1"}),
-    [](const ::testing::TestParamInfo<RewriteCase> &info) { return std::string(info.param.label); });
+        rewrite("Longest", long_name(1021, ".utf8"), 1, long_name(1022, ".UTF-8")),
+        rewrite("TooLong", long_name(1022, ".utf8"), 1, "en_US.ISO8859-1", CHARSET_LATIN1),
+        rewrite("FarTooLong", long_name(100000, ".UTF8"), 1, "en_US.ISO8859-1", CHARSET_LATIN1)),
+    [](const ::testing::TestParamInfo<Case> &info) { return std::string(info.param.label); });
 
 }  // namespace
