@@ -70,15 +70,13 @@ TEST(EngineOracle, KOI8RCharacterFunctionsEveryByte) {
         char out[2] = {0, 0}, *q = out;
         uint16_t unit = 0;
         ASSERT_EQ(FromKOI8RToUnicode(&p, &unit), 1);
-        EXPECT_EQ(unit, as_units(*decode(std::string(1, byte[0])))[0]) << b;
-        EXPECT_EQ(p, byte + 1);
+        EXPECT_EQ(std::tuple(unit, p), std::tuple(as_units(*decode(byte))[0], byte + 1)) << b;
         ASSERT_EQ(FromUnicodeToKOI8R(unit, &q), 1);
         EXPECT_EQ(std::string(out, q), std::string(1, char(b)));
     }
     char out = 'x', *q = &out;
     EXPECT_EQ(FromUnicodeToKOI8R(0x20AC, &q), 0);
-    EXPECT_EQ(q, &out);
-    EXPECT_EQ(out, 'x');
+    EXPECT_EQ(std::tuple(q, out), std::tuple(&out, 'x'));
 }
 
 TEST(EngineOracle, EveryMultiByteCodeBothWays) {
