@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <tuple>
 
 #include "engine_checks.h"
 #include "platform_shim.h"
@@ -57,16 +58,13 @@ TEST(EngineServerCP, EveryKnownCodePageAgainstIconv) {
 
 TEST(EngineServerCP, UnknownCodePagesAreCopiedAndCut) {
     for (int32_t page : {1253, 0, -1, 65001}) {
-        Result cut = from_server(CHARSET_UTF8, page, "abcdef", 4);
-        EXPECT_EQ(cut.bytes, std::string("abc\0", 4));
-        EXPECT_EQ(cut.length, 4u);
-        Result padded = from_server(CHARSET_UTF8, page, "ab", 8);
-        EXPECT_EQ(padded.bytes, std::string("ab\0\0\0\0\0\0", 8));
-        EXPECT_EQ(padded.length, 3u);
+        Result cut = from_server(CHARSET_UTF8, page, "abcdef", 4),
+               padded = from_server(CHARSET_UTF8, page, "ab", 8);
+        EXPECT_EQ(std::tuple(cut.bytes, cut.length), std::tuple(std::string("abc\0", 4), 4u));
+        EXPECT_EQ(std::tuple(padded.bytes, padded.length), std::tuple(std::string("ab\0\0\0\0\0\0", 8), 3u));
     }
     Result none = from_server(CHARSET_UTF8, 1253, "ab", 0);  // no room: nothing written
-    EXPECT_TRUE(none.guardIntact);
-    EXPECT_EQ(none.length, 0u);
+    EXPECT_EQ(std::tuple(none.guardIntact, none.length), std::tuple(true, 0u));
     EXPECT_EQ(shim::mallocs, 0);
 }
 
@@ -74,9 +72,8 @@ TEST(EngineServerCP, TextNotConvertedIsCopiedFromItsStart) {
     const std::string cyrillic = "\xCF\xF0\xE8\xE2\xE5\xF2 world";  // CP1251, 19 bytes converted
     testing::internal::CaptureStderr();
     const auto expect_copy = [&](const Result &r, uint32_t length) {
-        EXPECT_EQ(r.text(), cyrillic.substr(0, length - 1));
-        EXPECT_EQ(r.length, length);
-        EXPECT_TRUE(r.guardIntact);
+        EXPECT_EQ(std::tuple(r.text(), r.length, r.guardIntact),
+                  std::tuple(cyrillic.substr(0, length - 1), length, true));
     };
     shim::mallocFails = true;
     expect_copy(from_server(CHARSET_UTF8, 1251, cyrillic, 32), 13);  // no memory
