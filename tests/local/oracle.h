@@ -3,6 +3,7 @@
 
 #include <iconv.h>
 
+#include <algorithm>
 #include <map>
 #include <optional>
 #include <string>
@@ -12,8 +13,7 @@
 
 namespace localtest {
 
-// One unit at a time to a charset through one open glibc descriptor; the
-// answers are kept, so exhaustive sweeps stay cheap.
+// One unit at a time to a charset through one glibc descriptor, answers kept.
 class UnitOracle {
   public:
     explicit UnitOracle(const char *charset) : cd_(iconv_open(charset, "UTF-16LE")) {}
@@ -46,17 +46,10 @@ class UnitOracle {
 inline std::vector<std::string> utf8_lines(size_t perFile) {
     std::vector<std::string> lines;
     for (const std::string &name : testsupport::corpus_files(".utf8.txt")) {
-        auto text = testsupport::read_corpus(name);
-        if (!text) continue;
-        size_t start = 0, taken = 0;
-        while (start < text->size() && taken < perFile) {
-            size_t end = text->find('\n', start);
-            if (end == std::string::npos) end = text->size();
-            if (end > start) {
-                lines.push_back(text->substr(start, end - start));
-                ++taken;
-            }
-            start = end + 1;
+        const std::string text = testsupport::read_corpus(name).value_or("");
+        for (size_t start = 0, end, taken = 0; start < text.size() && taken < perFile; start = end + 1) {
+            end = std::min(text.find('\n', start), text.size());
+            if (end > start) lines.push_back(text.substr(start, end - start)), ++taken;
         }
     }
     return lines;
