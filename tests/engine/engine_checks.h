@@ -21,8 +21,9 @@ class Oracle {
   public:
     Oracle(const char *to, const char *from) : cd_(iconv_open(to, from)) {}
     ~Oracle() {
-        if (cd_ != iconv_t(-1)) iconv_close(cd_);
+        if (ok()) iconv_close(cd_);
     }
+    bool ok() const { return cd_ != iconv_t(-1); }
     std::optional<std::string> operator()(const std::string &in) {
         iconv(cd_, nullptr, nullptr, nullptr, nullptr);
         std::string out(in.size() * 4 + 8, '\0');
