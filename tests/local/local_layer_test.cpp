@@ -162,9 +162,11 @@ TEST(LOCAL_SUITE, LocalToUTF8EverySingleByte) {
     }
 }
 
-// Local text to UTF-16 and back: the string engine, one character at a time
-// and the Windows Unicode helpers; glibc gives the units.
-TEST(LOCAL_SUITE, UnicodeBothWays) {
+// Corpus lines the local charset holds, through every entry point that takes
+// local text: to UTF-16 and back (the string engine, one character at a time,
+// the Windows Unicode helpers; glibc gives the units), direction escaping and
+// equivalence.
+TEST(LOCAL_SUITE, LocalLinesEveryWay) {
     REQUIRE_CORPORA();
     int checked = 0;
     for (const Line &line : lines()) {
@@ -199,6 +201,29 @@ TEST(LOCAL_SUITE, UnicodeBothWays) {
         int32_t fromWide = static_cast<int32_t>(bytes);
         host_stringFromWindowsUnicode(reinterpret_cast<const char *>(wide.data()), back.data(), &fromWide);
         ASSERT_EQ(as_string(back.data(), fromWide), *line.local + '\0');
+
+        // Direction escaping in the local charset is that of its CharsetId.
+        const uint32_t room = static_cast<uint32_t>(3 * line.local->size() + 16);
+        std::vector<char> a(room, '\x7f'), b(a);
+        uint32_t la = room, lb = room;
+        StringFromLocalToDirectionEscapedString(a.data(), source, &la);
+        StringFromCharsetToDirectionEscapedString(kLocal, b.data(), source, &lb);
+        EXPECT_EQ(la, lb);
+        EXPECT_EQ(a, b);
+
+        // Equivalent to the UTF-8 line; with the last ASCII letter's case
+        // changed, only when case is ignored.
+        const char *u = line.utf8.c_str();
+        ASSERT_EQ(StringsEquivalent(u, CHARSET_UTF8, source, kLocal, 0), 1);
+        ASSERT_EQ(StringsEquivalent(source, CHARSET_LATIN1, u, CHARSET_UTF8, 1), 1);
+        ASSERT_EQ(StringsEquivalent(source, CHARSET_NONE, source, CHARSET_UTF16, 0), 1);
+        std::string other = *line.local;
+        size_t k = other.find_last_of("abcdefghijklmnopqrstuvwxyz");
+        if (k != std::string::npos && (k == 0 || static_cast<unsigned char>(other[k - 1]) < 0x80)) {
+            other[k] = static_cast<char>(other[k] - 'a' + 'A');
+            EXPECT_EQ(StringsEquivalent(u, CHARSET_UTF8, other.c_str(), kLocal, 0), 0);
+            EXPECT_EQ(StringsEquivalent(u, CHARSET_UTF8, other.c_str(), kLocal, 1), 1);
+        }
         ++checked;
     }
     EXPECT_GT(checked, 10);
@@ -281,52 +306,6 @@ TEST(LOCAL_SUITE, ListWhoseLastStringHasNoTerminator) {
     // "ab", "" and "cd" cut by the length before its 0 unit; the odd byte is ignored.
     EXPECT_EQ(hex(convert_list(u"ab\0\0cdXYZ"s, 2 * 6 + 1)), hex(std::string("ab\0\0cd\0\0", 8)));
     for (uint32_t none : {0u, 1u}) EXPECT_EQ(convert_list(u"", none), std::string(1, '\0'));
-}
-
-TEST(LOCAL_SUITE, DirectionEscapingInTheLocalCharset) {
-    REQUIRE_CORPORA();
-    int checked = 0;
-    for (size_t i = 0; i < lines().size(); i += 5) {
-        if (!lines()[i].local) continue;
-        const char *source = lines()[i].local->c_str();
-        const uint32_t room = static_cast<uint32_t>(3 * std::strlen(source) + 16);
-        std::vector<char> a(room, '\x7f'), b(a);
-        uint32_t la = room, lb = room;
-        StringFromLocalToDirectionEscapedString(a.data(), source, &la);
-        StringFromCharsetToDirectionEscapedString(kLocal, b.data(), source, &lb);
-        EXPECT_EQ(la, lb);
-        EXPECT_EQ(a, b);
-        ++checked;
-    }
-    EXPECT_GT(checked, 5);
-}
-
-// A UTF-8 line against the same line in the local charset and changed copies.
-TEST(LOCAL_SUITE, EquivalenceAcrossEncodings) {
-    REQUIRE_CORPORA();
-    int checked = 0;
-    for (const Line &line : lines()) {
-        if (!line.local || line.utf8.size() < 2) continue;
-        const char *u = line.utf8.c_str(), *l = line.local->c_str();
-        ASSERT_EQ(StringsEquivalent(u, CHARSET_UTF8, l, kLocal, 0), 1) << line.utf8;
-        ASSERT_EQ(StringsEquivalent(l, CHARSET_LATIN1, u, CHARSET_UTF8, 1), 1) << line.utf8;
-        ASSERT_EQ(StringsEquivalent(l, CHARSET_NONE, l, CHARSET_UTF16, 0), 1) << line.utf8;
-        std::string shorter = line.local->substr(0, line.local->size() - 1);  // a character short
-        if (static_cast<unsigned char>(line.local->back()) < 0x80) {
-            EXPECT_EQ(StringsEquivalent(u, CHARSET_UTF8, shorter.c_str(), kLocal, 0), 0);
-            EXPECT_EQ(StringsEquivalent(shorter.c_str(), kLocal, u, CHARSET_UTF8, 0), 0);
-        }
-        // The last ASCII letter's case changed: equal only when case is ignored.
-        std::string other = *line.local;
-        size_t k = other.find_last_of("abcdefghijklmnopqrstuvwxyz");
-        if (k != std::string::npos && (k == 0 || static_cast<unsigned char>(other[k - 1]) < 0x80)) {
-            other[k] = static_cast<char>(other[k] - 'a' + 'A');
-            EXPECT_EQ(StringsEquivalent(u, CHARSET_UTF8, other.c_str(), kLocal, 0), 0);
-            EXPECT_EQ(StringsEquivalent(u, CHARSET_UTF8, other.c_str(), kLocal, 1), 1);
-        }
-        ++checked;
-    }
-    EXPECT_GT(checked, 10);
 }
 
 // Local to UTF-8 failures and small rooms that only one charset shows.
