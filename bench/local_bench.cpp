@@ -1,8 +1,10 @@
 // The local layer on real text: StringsEquivalent on two equal UTF-8 strings
 // against ICU turning one of them into UTF-16, and StringFromUTF8ToLocal into
 // the process's local charset (Latin-1 unless LANG names another) against
-// glibc iconv. Throughput counts the bytes of one UTF-8 input.
+// glibc iconv and ICU (with "?" as its substitute, as the library writes). Throughput counts the bytes of one
+// UTF-8 input.
 #include <iconv.h>
+#include <unicode/ucnv.h>
 #include <unicode/ustring.h>
 
 #include <cstring>
@@ -99,11 +101,41 @@ void utf8_to_local_iconv(benchmark::State &state, const std::string &corpus) {
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
 }
 
+void utf8_to_local_icu(benchmark::State &state, const std::string &corpus) {
+    const std::string text = fitting_utf8(corpus);
+    UErrorCode err = U_ZERO_ERROR;
+    UConverter *source = ucnv_open("UTF-8", &err);
+    UConverter *target = ucnv_open(charsetConversion[LocalEncoding()].iconvName, &err);
+    if (U_SUCCESS(err)) ucnv_setSubstChars(target, "?", 1, &err);
+    if (U_FAILURE(err)) {
+        state.SkipWithError("ICU cannot open the local charset");
+        return;
+    }
+    std::vector<char> out(4 * text.size() + 8);
+    UChar pivot[1024];
+    for (auto _ : state) {
+        UChar *pivotSource = pivot, *pivotTarget = pivot;
+        char *op = out.data();
+        const char *ip = text.data();
+        err = U_ZERO_ERROR;
+        ucnv_convertEx(target, source, &op, out.data() + out.size(), &ip, text.data() + text.size(), pivot,
+                       &pivotSource, &pivotTarget, pivot + 1024, true, true, &err);
+        if (U_FAILURE(err)) state.SkipWithError("ICU failed");
+        benchmark::DoNotOptimize(op);
+        benchmark::ClobberMemory();
+    }
+    ucnv_close(source);
+    ucnv_close(target);
+    state.SetLabel(charsetConversion[LocalEncoding()].iconvName);
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
 [[maybe_unused]] const bool registered = [] {
     register_per_corpus("Equivalent/textconv", ".utf8.txt", equivalent_textconv);
     register_per_corpus("Equivalent/icu", ".utf8.txt", equivalent_icu);
     register_per_corpus("UTF8toLocal/textconv", ".utf8.txt", utf8_to_local_textconv);
     register_per_corpus("UTF8toLocal/iconv", ".utf8.txt", utf8_to_local_iconv);
+    register_per_corpus("UTF8toLocal/icu", ".utf8.txt", utf8_to_local_icu);
     return true;
 }();
 
