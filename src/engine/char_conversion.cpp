@@ -60,6 +60,9 @@ TEXTCONV_API int FromUnicodeToCharset(CharsetId charset, uint32_t unit, char **d
     char *out = fromUnicodeCharBuffer;
     size_t outLeft = sizeof fromUnicodeCharBuffer;
     if (iconv(cd, &in, &inLeft, &out, &outLeft) == kIconvFailed) return 0;
+    // A converter that composes characters (Big5-HKSCS) holds a unit that a
+    // combining mark might follow: the character is this call's, so flush it.
+    if (out == fromUnicodeCharBuffer && iconv(cd, nullptr, nullptr, &out, &outLeft) == kIconvFailed) return 0;
     // Bytes as written, a target's byte-order mark included.
     for (const char *p = fromUnicodeCharBuffer; p != out; ++p) *(*destination)++ = *p;
     return 1;

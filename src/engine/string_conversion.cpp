@@ -142,6 +142,9 @@ int string_from_unicode_to_charset(CharsetId charset, const uint16_t **source, c
         // A full destination, or no room left for the "?": fail without
         // another call, the pointers on this pass's start.
         if (error != EILSEQ || outLeft < substituteSize || inLeft < 2) {
+            // A converter that composes characters (Big5-HKSCS) may still hold
+            // one; it must not surface at the start of the next call's text.
+            iconv(cd, nullptr, nullptr, nullptr, nullptr);
             *length = written;
             return 0;
         }

@@ -235,3 +235,27 @@ TEST(EngineOracle, RealTextBothWays) {
     }
     if (files == 0) GTEST_SKIP() << "no corpora";
 }
+
+TEST(EngineOracle, ComposingConverterHoldsNothingAcrossCalls) {
+    // glibc's Big5-HKSCS keeps U+00CA/U+00EA back in case a combining mark
+    // follows; neither a single character nor a failed text may leave it held.
+    char bytes[8] = {};
+    char *cursor = bytes;
+    ASSERT_EQ(FromUnicodeToCharset(CHARSET_BIG5HKSCS, 0x00EA, &cursor), 1);
+    EXPECT_EQ(std::string(bytes, cursor), "\x88\xA7");
+    cursor = bytes;
+    ASSERT_EQ(FromUnicodeToCharset(CHARSET_BIG5HKSCS, 'B', &cursor), 1);
+    EXPECT_EQ(std::string(bytes, cursor), "B");
+
+    const uint16_t text[] = {'A', 0x00CA, 'B', 0};
+    const uint16_t *source = text;
+    char *destination = bytes;
+    uint32_t length = 2;  // A fits, then the held U+00CA with B does not
+    ASSERT_EQ(StringFromUnicodeToCharset(CHARSET_BIG5HKSCS, &source, &destination, &length), 0);
+    const uint16_t next[] = {'B', 0};
+    source = next;
+    destination = bytes;
+    length = sizeof bytes;
+    ASSERT_EQ(StringFromUnicodeToCharset(CHARSET_BIG5HKSCS, &source, &destination, &length), 1);
+    EXPECT_EQ(std::string(bytes, length), std::string("B\0", 2));
+}
