@@ -402,7 +402,9 @@ TEXTCONV_API int FromUnicodeToLocal(uint32_t unit, char **cursor);
 TEXTCONV_API int FromLocalToUnicode(const char **cursor, uint16_t *target, uint32_t *count);
 
 /* NUL-terminated UTF-8 to the local encoding. No capacity is taken: target
- * must hold the converted text and its NUL (at most 4 bytes per unit).
+ * must hold the converted text and its NUL: strlen(source) + 1 bytes when
+ * the local encoding is UTF-8 (the bytes are copied as they stand), else at
+ * most 4 bytes per UTF-16 unit of the decoded text, plus 1.
  * *length (out only): bytes written including the NUL. Returns 1; 0 when a
  * unit became "?" (output complete) or when the UTF-8 ends in a cut-short
  * sequence or memory runs out (nothing written, *length untouched). */
