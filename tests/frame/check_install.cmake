@@ -1,0 +1,25 @@
+# Installs the build into a fresh prefix, then builds and runs a host
+# application against it through find_package, and reads the pkg-config file.
+file(REMOVE_RECURSE ${WORK})
+execute_process(COMMAND ${CMAKE_COMMAND} --install ${BUILD} --prefix ${WORK}/prefix
+                RESULT_VARIABLE rc OUTPUT_QUIET)
+if(rc)
+  message(FATAL_ERROR "cmake --install failed")
+endif()
+execute_process(COMMAND ${CMAKE_COMMAND} -S ${CONSUMER} -B ${WORK}/app -DCMAKE_PREFIX_PATH=${WORK}/prefix
+                -DCMAKE_C_COMPILER=${C_COMPILER} RESULT_VARIABLE rc)
+if(NOT rc)
+  execute_process(COMMAND ${CMAKE_COMMAND} --build ${WORK}/app RESULT_VARIABLE rc)
+endif()
+if(rc)
+  message(FATAL_ERROR "a consumer of the installed package does not build")
+endif()
+execute_process(COMMAND ${WORK}/app/app RESULT_VARIABLE rc)
+if(rc)
+  message(FATAL_ERROR "the consumer of the installed package fails: ${rc}")
+endif()
+file(GLOB_RECURSE pc ${WORK}/prefix/*/textconv.pc)
+file(READ "${pc}" text)
+if(NOT text MATCHES "prefix=\\$\\{pcfiledir\\}" OR NOT text MATCHES "-ltextconv")
+  message(FATAL_ERROR "textconv.pc is not relocatable or does not link the library:\n${text}")
+endif()
