@@ -6,7 +6,7 @@ execute_process(COMMAND ${CMAKE_COMMAND} --install ${BUILD} --prefix ${WORK}/pre
 if(rc)
   message(FATAL_ERROR "cmake --install failed")
 endif()
-execute_process(COMMAND ${CMAKE_COMMAND} -S ${CONSUMER} -B ${WORK}/app -DCMAKE_PREFIX_PATH=${WORK}/prefix
+execute_process(COMMAND ${CMAKE_COMMAND} -S ${CONSUMER} -B ${WORK}/app -G ${GENERATOR} -DCMAKE_PREFIX_PATH=${WORK}/prefix
                 -DCMAKE_C_COMPILER=${C_COMPILER} RESULT_VARIABLE rc)
 if(NOT rc)
   execute_process(COMMAND ${CMAKE_COMMAND} --build ${WORK}/app RESULT_VARIABLE rc)
