@@ -407,7 +407,8 @@ TEXTCONV_API int FromLocalToUnicode(const char **cursor, uint16_t *target, uint3
  * most 4 bytes per UTF-16 unit of the decoded text, plus 1.
  * *length (out only): bytes written including the NUL. Returns 1; 0 when a
  * unit became "?" (output complete) or when the UTF-8 ends in a cut-short
- * sequence or memory runs out (nothing written, *length untouched). */
+ * sequence or is longer than (2^32 - 2) / 4 bytes (nothing written, *length
+ * untouched). Nothing is allocated. */
 TEXTCONV_API int StringFromUTF8ToLocal(const char *source, char *target, uint32_t *length);
 
 /* NUL-terminated local text to UTF-8. *length in: capacity, read only when the

@@ -2,7 +2,13 @@
 #include <cstring>
 
 #include "frame/registry.h"
+#include "local/known_units.h"
+#include "local/unit_table.h"
 #include "textconv.h"
+#include "unicode/utf_internal.h"
+#include "unicode/utf_scalar.h"
+
+using namespace textconv;
 
 namespace {
 
@@ -25,54 +31,169 @@ constexpr bool is_single_byte(CharsetId charset) {
     }
 }
 
-// What the converter made of the units of a single-byte charset, kept so that
-// text seen again needs no iconv call. A unit is recorded only once the
-// charset's converter is open: until then, and for ever when it cannot be
-// opened, every unit goes to the converter as before (with its question and
-// messages). Direct-mapped; a unit that finds its slot taken asks again.
-struct UnitByteCache {
-    struct Entry {
-        uint16_t unit;
-        uint8_t byte;
-        uint8_t state;  // 0 nothing known, 1 byte holds the unit, 2 no byte does
-    };
-    static constexpr unsigned kSlots = 1024;
-    CharsetId charset;  // whose units the entries hold
-    Entry entries[kSlots];
-};
-UnitByteCache unitCache;
-
-inline unsigned slot_of(uint16_t unit) { return ((unit * 40503u) >> 6) & (UnitByteCache::kSlots - 1); }
+// The local charset never changes in a process; should another single-byte
+// charset come here, the table starts again for it.
+UnitByteTable unitTable;
 
 bool converter_open(CharsetId charset) {
     const textconv::ConverterCell cell = textconv::fromUnicodeConverters[charset];
     return cell != textconv::unopened_cell() && cell != textconv::failed_cell();
 }
 
-// The local charset never changes in a process; should another charset come
-// here, the cache starts again for it.
-inline void claim_cache(CharsetId charset) {
-    if (unitCache.charset == charset) return;
-    std::memset(unitCache.entries, 0, sizeof unitCache.entries);
-    unitCache.charset = charset;
-}
-
-// FromUnicodeToCharset, through the cache for a single-byte charset.
-int unit_to_charset(CharsetId charset, uint32_t unit, char **cursor) {
-    if (!is_single_byte(charset)) return FromUnicodeToCharset(charset, unit, cursor);
-    claim_cache(charset);
-    const auto u = static_cast<uint16_t>(unit);
-    UnitByteCache::Entry &e = unitCache.entries[slot_of(u)];
-    if (e.state != 0 && e.unit == u) {
-        if (e.state == 2) return 0;
-        *(*cursor)++ = static_cast<char>(e.byte);
-        return 1;
-    }
+// FromUnicodeToCharset for a unit of a single-byte charset that the table
+// does not know yet. What the converter says is recorded only once it is
+// open: until then, and for ever when it cannot be opened, every unit goes to
+// the converter as before (with its question and messages).
+[[gnu::noinline]] int ask_converter(CharsetId charset, uint16_t unit, char **cursor) {
     char *start = *cursor;
     const int result = FromUnicodeToCharset(charset, unit, cursor);
     if (converter_open(charset)) {
-        if (result && *cursor - start == 1) e = {u, static_cast<uint8_t>(*start), 1};
-        if (!result) e = {u, 0, 2};
+        if (result && *cursor - start == 1) unitTable.record(unit, static_cast<uint8_t>(*start));
+        if (!result) unitTable.record(unit, UnitByteTable::kNoByte);
+    }
+    return result;
+}
+
+// One unit of a single-byte charset to the cursor: 1, or 0 with nothing written.
+inline int single_byte_unit(CharsetId charset, uint16_t unit, char **cursor) {
+    const int known = unitTable.find(unit);
+    if (known == UnitByteTable::kUnknown) return ask_converter(charset, unit, cursor);
+    if (known == UnitByteTable::kNoByte) return 0;
+    *(*cursor)++ = static_cast<char>(known);
+    return 1;
+}
+
+int unit_to_charset(CharsetId charset, uint32_t unit, char **cursor) {
+    if (!is_single_byte(charset)) return FromUnicodeToCharset(charset, unit, cursor);
+    unitTable.claim(charset);
+    return single_byte_unit(charset, static_cast<uint16_t>(unit), cursor);
+}
+
+// Whether UTF-8 of n bytes ends in a sequence cut short. Every byte that is
+// not a trailing byte starts a sequence, and no sequence is longer than 6
+// bytes, so decoding from the last such byte among the last 6 decides it.
+bool ends_cut_short(const uint8_t *s, size_t n) {
+    size_t lead = n;
+    for (size_t k = n; k > 0 && n - k < 6; --k) {
+        if ((s[k - 1] & 0xC0) != 0x80) {
+            lead = k - 1;
+            break;
+        }
+    }
+    if (lead == n) return false;
+    uint16_t units[8];
+    uint32_t written = 0;
+    return utf8_to_utf16_scalar(s + lead, static_cast<uint32_t>(n - lead), units, sizeof units, &written) ==
+           TEXTCONV_UTF_SOURCE_INCOMPLETE;
+}
+
+// Units of one sequence through `convert`; "?" for each it refuses.
+template <class Convert>
+inline int sequence_to_local(const uint8_t *s, uint32_t n, uint32_t &p, char *&out, Convert convert) {
+    uint16_t units[2];
+    uint32_t written = 0;
+    utf8_decode_step(s, n, p, units, sizeof units, written);
+    int result = 1;
+    for (uint32_t k = 0; k < written / 2; ++k) {
+        // A surrogate pair goes over as two separate units.
+        if (!convert(units[k], &out)) {
+            *out++ = '?';
+            result = 0;
+        }
+    }
+    return result;
+}
+
+// One unit of a single-byte charset at o, "?" when it has no byte; returns
+// the position after it. (Pointers are passed by value here: a char store
+// through a pointer held in memory would make the compiler reload it.)
+inline char *put_unit(CharsetId charset, uint16_t unit, char *o, int &result) {
+    const int known = unitTable.find(unit);
+    if (known >= 0 && known != UnitByteTable::kNoByte) {
+        *o = static_cast<char>(known);
+        return o + 1;
+    }
+    if (known == UnitByteTable::kUnknown) {
+        char *after = o;
+        if (ask_converter(charset, unit, &after)) return after;
+        o = after;
+    }
+    *o = '?';
+    result = 0;
+    return o + 1;
+}
+
+// Units to a single-byte charset, one byte each: known units by blocks, and
+// what the blocks leave, up to 32 units, one by one through the table.
+char *units_to_single_byte(CharsetId charset, const uint16_t *units, uint32_t count, char *o, int &result) {
+    const uint16_t *u = units, *const end = units + count;
+    while (u < end) {
+        if (end - u >= 32) {
+            const size_t run =
+                copy_known_units(u, static_cast<size_t>(end - u), reinterpret_cast<uint8_t *>(o),
+                                 unitTable.flat_table(), unitTable.ascii_rows(), unitTable.page_base());
+            u += run;
+            o += run;
+        }
+        for (const uint16_t *stop = end - u > 32 ? u + 32 : end; u < stop; ++u) {
+            const int byte = unitTable.known_direct_byte(*u);
+            if (byte >= 0)
+                *o++ = static_cast<char>(byte);
+            else
+                o = put_unit(charset, *u, o, result);
+        }
+    }
+    return o;
+}
+
+// Text is decoded in chunks of at most this many bytes (as many units).
+constexpr uint32_t kChunk = 256;
+
+// Where a chunk from p may end so that it decodes on its own exactly as
+// within the whole text: at the end, or just after an ASCII byte (a sequence
+// of its own, which breaks any sequence it falls into). 0 when the next
+// kChunk bytes hold no ASCII byte.
+uint32_t chunk_end(const uint8_t *s, uint32_t n, uint32_t p) {
+    if (n - p <= kChunk) return n;
+    for (uint32_t i = p + kChunk; i > p; --i)
+        if (s[i - 1] < 0x80) return i;
+    return 0;
+}
+
+// UTF-8 known to be complete into a single-byte charset: decoded by the UTF
+// core in chunks into a buffer on the stack, then the units through the
+// table; units it does not know yet go to the converter.
+int utf8_to_single_byte(CharsetId charset, const uint8_t *s, uint32_t n, char *&out) {
+    unitTable.claim(charset);
+    int result = 1;
+    uint16_t units[kChunk];
+    uint32_t p = 0;
+    while (p < n) {
+        const uint32_t end = chunk_end(s, n, p);
+        if (end == 0) {
+            for (const uint32_t stop = p + kChunk; p < stop;) {
+                result &= sequence_to_local(s, n, p, out, [charset](uint16_t unit, char **cursor) {
+                    return single_byte_unit(charset, unit, cursor);
+                });
+            }
+            continue;
+        }
+        uint32_t written = 0;
+        utf8_to_utf16(s + p, end - p, units, sizeof units, &written);  // whole sequences: cannot fail
+        out = units_to_single_byte(charset, units, written / 2, out, result);
+        p = end;
+    }
+    return result;
+}
+
+// Any other charset: every unit to the converter.
+int utf8_to_any(CharsetId charset, const uint8_t *s, uint32_t n, char *&out) {
+    int result = 1;
+    uint32_t p = 0;
+    while (p < n) {
+        result &= sequence_to_local(s, n, p, out, [charset](uint16_t unit, char **cursor) {
+            return FromUnicodeToCharset(charset, unit, cursor);
+        });
     }
     return result;
 }
@@ -110,45 +231,16 @@ TEXTCONV_API int StringFromUTF8ToLocal(const char *source, char *target, uint32_
         *length = static_cast<uint32_t>(n + 1);
         return 1;
     }
-    // One unit per byte at most; a size beyond 32 bits cannot be had from
-    // the host.
-    const uint64_t scratchBytes = 2 * (static_cast<uint64_t>(n) + 1);
-    if (scratchBytes > UINT32_MAX) return 0;
-    auto *units = static_cast<uint16_t *>(HostMalloc(static_cast<uint32_t>(scratchBytes), 1));
-    if (!units) return 0;
-    uint32_t decoded = 0;
-    if (ConvertUTF8toUTF16(source, static_cast<uint32_t>(n), units, static_cast<uint32_t>(scratchBytes),
-                           &decoded) != TEXTCONV_UTF_DONE) {
-        HostFree(units);
-        return 0;
-    }
-    int result = 1;
+    // Up to 4 bytes a unit, one unit a byte at most: longer text would
+    // overflow the 32-bit length. A text that ends cut short is refused before
+    // anything is written or any converter opened.
+    const auto *s = reinterpret_cast<const uint8_t *>(source);
+    if (n > (UINT32_MAX - 1) / 4 || ends_cut_short(s, n)) return 0;
     char *out = target;
-    const uint32_t count = decoded / 2;
-    uint32_t i = 0;
-    if (is_single_byte(local)) {
-        // Units seen before take their byte from the cache.
-        claim_cache(local);
-        for (; i < count && units[i] != 0; ++i) {
-            const UnitByteCache::Entry e = unitCache.entries[slot_of(units[i])];
-            if (e.state == 1 && e.unit == units[i]) {
-                *out++ = static_cast<char>(e.byte);
-            } else if (!unit_to_charset(local, units[i], &out)) {
-                *out++ = '?';
-                result = 0;
-            }
-        }
-    }
-    for (; i < count && units[i] != 0; ++i) {
-        // A surrogate pair goes over as two separate units.
-        if (!unit_to_charset(local, units[i], &out)) {
-            *out++ = '?';
-            result = 0;
-        }
-    }
+    const int result = is_single_byte(local) ? utf8_to_single_byte(local, s, static_cast<uint32_t>(n), out)
+                                             : utf8_to_any(local, s, static_cast<uint32_t>(n), out);
     *out++ = '\0';
     *length = static_cast<uint32_t>(out - target);
-    HostFree(units);
     return result;
 }
 

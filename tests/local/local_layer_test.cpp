@@ -3,6 +3,7 @@
 // (EXPECTED_LOCAL) and the charset's glibc name (EXPECTED_ICONV).
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
 #include <random>
 #include <string>
@@ -48,8 +49,47 @@ std::string as_string(const void *p, size_t n) { return std::string(static_cast<
 
 TEST(LOCAL_SUITE, LocaleGivesTheExpectedCharset) { EXPECT_EQ(LocalEncoding(), kLocal); }
 
-// Corpus lines and random text; the oracle takes every unit on its own and
-// "?" for one the charset cannot hold.
+// StringFromUTF8ToLocal against a model: every unit on its own through
+// iconv, "?" for one the charset cannot hold. Returns whether the model
+// converted every unit.
+bool expect_like_oracle(localtest::UnitOracle &oracle, const std::string &utf8) {
+    std::string expected = utf8;
+    bool complete = true, cutShort = false;
+    if (!kUtf8) {
+        // Decoded by the library's UTF-8 decoder (tested on its own), which
+        // also reads ill-formed text.
+        std::u16string units(utf8.size(), u'\0');
+        uint32_t written = 0;
+        cutShort = ConvertUTF8toUTF16(utf8.data(), static_cast<uint32_t>(utf8.size()),
+                                      reinterpret_cast<uint16_t *>(units.data()), 2 * units.size(),
+                                      &written) != TEXTCONV_UTF_DONE;
+        units.resize(cutShort ? 0 : written / 2);
+        expected.clear();
+        for (char16_t u : units) {
+            auto b = oracle.bytes(u);
+            expected += b.value_or("?");
+            complete &= b.has_value();
+        }
+    }
+    std::vector<char> target(4 * utf8.size() + 8, '\x7f');
+    uint32_t length = 12345;
+    int r = StringFromUTF8ToLocal(utf8.c_str(), target.data(), &length);
+    if (cutShort) {
+        EXPECT_EQ(r, 0) << hex(utf8);
+        EXPECT_EQ(length, 12345u) << hex(utf8);
+        EXPECT_EQ(target[0], '\x7f') << hex(utf8);
+        return false;
+    }
+    EXPECT_EQ(length, expected.size() + 1) << hex(utf8);
+    EXPECT_EQ(hex(as_string(target.data(), std::min<size_t>(length, target.size() - 1) + 1)),
+              hex(expected + '\0' + '\x7f'))
+        << hex(utf8);
+    EXPECT_EQ(r, complete ? 1 : 0) << hex(utf8);
+    return complete;
+}
+
+// Corpus lines and random text; where glibc converts a whole line, so must the
+// library.
 TEST(LOCAL_SUITE, UTF8ToLocalAgreesWithIconv) {
     REQUIRE_CORPORA();
     localtest::UnitOracle oracle(kCharset);
@@ -57,24 +97,8 @@ TEST(LOCAL_SUITE, UTF8ToLocalAgreesWithIconv) {
     int whole = 0, substituted = 0;
     auto check = [&](const std::string &utf8, const std::optional<std::string> &local) {
         if (HasFailure()) return;
-        std::string expected = utf8;
-        bool complete = true;
-        if (!kUtf8) {
-            expected.clear();
-            const std::u16string units = *testsupport::iconv_to_utf16("UTF-8", utf8);
-            for (char16_t u : units) {
-                auto b = oracle.bytes(u);
-                expected += b.value_or("?");
-                complete &= b.has_value();
-            }
-        }
-        std::vector<char> target(4 * utf8.size() + 8, '\x7f');
-        uint32_t length = 12345;
-        int r = StringFromUTF8ToLocal(utf8.c_str(), target.data(), &length);
-        ASSERT_EQ(length, expected.size() + 1) << hex(utf8);
-        ASSERT_EQ(hex(as_string(target.data(), length + 1)), hex(expected + '\0' + '\x7f')) << hex(utf8);
-        EXPECT_EQ(r, complete ? 1 : 0);
-        EXPECT_EQ(expected, local.value_or(expected));  // glibc converts the whole line: so must the library
+        const bool complete = expect_like_oracle(oracle, utf8);
+        EXPECT_TRUE(complete || !local) << hex(utf8);
         ++(local ? whole : substituted);
     };
     for (const Line &line : lines()) check(line.utf8, line.local);
@@ -84,6 +108,56 @@ TEST(LOCAL_SUITE, UTF8ToLocalAgreesWithIconv) {
     }
     EXPECT_GT(whole, 0);
     EXPECT_TRUE(kUtf8 || substituted > 0);
+}
+
+// Long ASCII runs, which go by whole blocks once their units are known,
+// broken at every offset by an ASCII unit seen for the first time, and
+// followed by non-ASCII text or ill-formed bytes.
+TEST(LOCAL_SUITE, UTF8ToLocalRunsOfKnownAscii) {
+    localtest::UnitOracle oracle(kCharset);
+    ASSERT_TRUE(oracle.ok());
+    const std::string words = "the quick brown fox jumps over the lazy dog. ";
+    std::string fresh;  // ASCII units the words do not use, each inserted once
+    for (char c = 1; c < 0x7F; ++c)
+        if (words.find(c) == std::string::npos) fresh += c;
+    const char *breaks[] = {"\xC3\xA9", "\xD0\xB6", "\xD7\x90", "\xE2\x82\xAC", "\xF0\x9F\x98\x80",
+                            "\xFF",     "\xE3\x41", "",         "\xE3\x81",     "\xC3"};
+    std::mt19937 rng(7);
+    for (size_t k = 0; k < fresh.size() && !HasFailure(); ++k) {
+        std::string s = words + words + words;
+        s.insert(k, 1, fresh[k]);
+        s.insert(s.size() - rng() % 40 * (k % 3), breaks[k % std::size(breaks)]);
+        expect_like_oracle(oracle, s);
+    }
+}
+
+// Long texts of the letters the charset holds, whose alphabet grows from
+// text to text, so that units seen for the first time stand among known
+// ones at every place of a block.
+TEST(LOCAL_SUITE, UTF8ToLocalLongTextsOfLetters) {
+    localtest::UnitOracle oracle(kCharset);
+    ASSERT_TRUE(oracle.ok());
+    std::u16string letters;
+    for (char16_t first : {0x80, 0x400, 0x580, 0x600, 0xE00})
+        for (char16_t u = first; u < first + 0x80; ++u)
+            if (oracle.bytes(u)) letters += u;
+    std::mt19937 rng(11);
+    std::shuffle(letters.begin(), letters.end(), rng);
+    for (size_t round = 0; round < 60 && !HasFailure(); ++round) {
+        std::u16string text;
+        const size_t alphabet = std::min(letters.size(), 4 + 2 * round);
+        for (int k = 0; k < 300; ++k) {
+            const uint32_t r = rng() % 8;
+            text += r == 0                    ? u' '
+                    : r == 1 || alphabet == 0 ? char16_t(u'a' + rng() % 26)
+                                              : letters[rng() % alphabet];
+        }
+        if (round % 4 == 3) text += u'\x20AC';  // held by some charsets, "?" in others
+        expect_like_oracle(oracle,
+                           *testsupport::iconv_convert(
+                               "UTF-8", "UTF-16LE",
+                               std::string(reinterpret_cast<const char *>(text.data()), 2 * text.size())));
+    }
 }
 
 // UTF-8 cut short: nothing written (copied as is when the local charset is UTF-8).
