@@ -94,6 +94,17 @@ bool starts_with_converter_mark(CharsetId charset, const char *passSource, const
     return !sourceMark || (written >= 4 && unit_at(output, 1) == kByteOrderMark);
 }
 
+// Converts a "?" unit at out; returns the bytes written (the converter's
+// mark included), 0 when they do not fit in room.
+size_t leading_unit_substitute(iconv_t cd, char *out, size_t room) {
+    uint16_t question = '?';
+    char *in = reinterpret_cast<char *>(&question);
+    size_t inLeft = sizeof question, outLeft = room;
+    char *at = out;
+    if (iconv(cd, &in, &inLeft, &at, &outLeft) == kIconvFailed) return 0;
+    return room - outLeft;
+}
+
 }  // namespace
 
 int string_from_unicode_to_charset(CharsetId charset, const uint16_t **source, char **destination,
@@ -148,11 +159,23 @@ int string_from_unicode_to_charset(CharsetId charset, const uint16_t **source, c
             *length = written;
             return 0;
         }
-        memcpy(out, substitute, substituteSize);
+        size_t placed = substituteSize;
+        if (charset == CHARSET_UTF16 && total + written == 0) {
+            // A leading "?" goes through the converter, so that the mark it
+            // writes in front of its first output stays in front.
+            placed = leading_unit_substitute(cd, out, outLeft);
+            if (placed == 0) {
+                iconv(cd, nullptr, nullptr, nullptr, nullptr);
+                *length = 0;
+                return 0;
+            }
+        } else {
+            memcpy(out, substitute, substituteSize);
+        }
         *source = reinterpret_cast<const uint16_t *>(in) + 1;
-        *destination = out + substituteSize;
-        total += written + static_cast<uint32_t>(substituteSize);
-        *length = static_cast<uint32_t>(outLeft - substituteSize);
+        *destination = out + placed;
+        total += written + static_cast<uint32_t>(placed);
+        *length = static_cast<uint32_t>(outLeft - placed);
     }
 }
 

@@ -185,6 +185,20 @@ TEST(EngineOracle, SixteenBitTextStaysInStepAfterARejectedUnit) {
     EXPECT_EQ(decode_char(CHARSET_UTF16, as_bytes({0xDC00, 'D'}).c_str()), Char(1, 0xFFFD, 2));
 }
 
+// The converter's first output: its mark comes first even when the text
+// opens with a unit the target lacks, and a room without space for the mark
+// fails.
+TEST(EngineOracle, UnitTargetMarkStaysInFrontOfALeadingSubstitute) {
+    for (uint32_t room = 0; room <= 10; ++room) {
+        Outcome out = from_unicode(CHARSET_UTF16, {0xDC00, 'A', 0xD800}, room);
+        EXPECT_EQ(out.result, room >= 10) << room;
+        if (out.result) {
+            EXPECT_EQ(out.units(), z(u"\xFEFF?A?"));
+        }
+        EXPECT_TRUE(out.guardIntact);
+    }
+}
+
 TEST(EngineOracle, CharacterDecoderThatTakesAMarkDeliversTheNextCharacter) {
     ASSERT_EQ(decode_char(CHARSET_LATIN1, "Z"), Char(1, 'Z', 1));  // left in the shared buffer
     // glibc's "UTF-16" decoder takes FF FE as a mark: success, no unit.
