@@ -26,10 +26,9 @@ size_t decoded_units(const std::string &utf8) {
 void utf8_to_local(fuzz::Reader &in) {
     bool valid = in.byte() & 1;
     std::string source = valid ? fuzz::valid_utf8(in, 120) : fuzz::without_nul(in.bytes(300));
-    // The contract's worst case, 4 bytes a unit; a UTF-8 device copies the
-    // text as it is, and a 5- or 6-byte form is one unit (known, reported in
-    // docs/RELIABILITY.md, fuzz/regressions/local/pending).
-    size_t room = std::max(4 * decoded_units(source), source.size()) + 1;
+    // The contract's worst case: the text as it is on a UTF-8 device, else 4
+    // bytes a unit.
+    size_t room = (local == CHARSET_UTF8 ? source.size() : 4 * decoded_units(source)) + 1;
     fuzz::Guarded target(room);
     uint32_t length = 0xDEADBEEF;
     int ok = StringFromUTF8ToLocal(source.c_str(), target.data(), &length);
