@@ -4,6 +4,7 @@
 #include <unicode/ucnv.h>
 #include <unicode/ustring.h>
 
+#include <algorithm>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -156,16 +157,63 @@ void latin1_iconv(benchmark::State &state, const std::string &text) {
     iconv_run(state, "UTF-8", "ISO-8859-1", text.data(), text.size(), text.size() * 2 + 16);
 }
 
+// The string and list forms and the local layer's Latin-1 path, built on
+// the same code; ICU's u_strFromUTF8 on the same text is the baseline.
+void utf8_string_textconv(benchmark::State &state, const std::string &text) {
+    std::vector<uint16_t> out(text.size() + 8);
+    for (auto _ : state) {
+        uint32_t length = static_cast<uint32_t>(out.size() * 2);
+        if (!StringFromUTF8ToUnicode(text.c_str(), out.data(), &length))
+            state.SkipWithError("conversion failed");
+        benchmark::DoNotOptimize(length);
+        benchmark::ClobberMemory();
+    }
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
+// The text's lines as a list of strings (each newline a NUL); the list
+// function returns a new block from the host each time, released here.
+void utf8_list_textconv(benchmark::State &state, const std::string &text) {
+    std::string list = text;
+    std::replace(list.begin(), list.end(), '\n', '\0');
+    for (auto _ : state) {
+        char *block = list.data();
+        uint32_t length = static_cast<uint32_t>(list.size());
+        if (!StringListFromUTF8toUTF16(&block, &length)) state.SkipWithError("conversion failed");
+        benchmark::DoNotOptimize(length);
+        HostFree(block);
+    }
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
+void latin1_local_textconv(benchmark::State &state, const std::string &text) {
+    if (LocalEncoding() != CHARSET_LATIN1) {
+        state.SkipWithError("the local encoding is not Latin-1 (set LANG)");
+        return;
+    }
+    std::vector<char> out(text.size() * 2 + 1);
+    for (auto _ : state) {
+        uint32_t len = static_cast<uint32_t>(out.size());
+        StringFromLocalToUTF8(text.c_str(), out.data(), &len);
+        benchmark::DoNotOptimize(len);
+        benchmark::ClobberMemory();
+    }
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
 [[maybe_unused]] const bool registered = [] {
     register_per_corpus("UTF8toUTF16/textconv", ".utf8.txt", utf8_to_utf16_textconv);
     register_per_corpus("UTF8toUTF16/icu", ".utf8.txt", utf8_to_utf16_icu);
     register_per_corpus("UTF8toUTF16/iconv", ".utf8.txt", utf8_to_utf16_iconv);
+    register_per_corpus("UTF8toUTF16/string", ".utf8.txt", utf8_string_textconv);
+    register_per_corpus("UTF8toUTF16/list", ".utf8.txt", utf8_list_textconv);
     register_per_corpus("UTF16toUTF8/textconv", ".utf8.txt", utf16_to_utf8_textconv);
     register_per_corpus("UTF16toUTF8/icu", ".utf8.txt", utf16_to_utf8_icu);
     register_per_corpus("UTF16toUTF8/iconv", ".utf8.txt", utf16_to_utf8_iconv);
     register_per_corpus("Latin1toUTF8/textconv", ".latin1.txt", latin1_textconv);
     register_per_corpus("Latin1toUTF8/icu", ".latin1.txt", latin1_icu);
     register_per_corpus("Latin1toUTF8/iconv", ".latin1.txt", latin1_iconv);
+    register_per_corpus("Latin1toUTF8/local", ".latin1.txt", latin1_local_textconv);
     return true;
 }();
 

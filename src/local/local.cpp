@@ -250,15 +250,7 @@ TEXTCONV_API int StringFromLocalToUTF8(const char *source, char *target, uint32_
     char *out = target;
     switch (local) {
         case CHARSET_LATIN1:
-            for (; *in; ++in) {
-                if (*in < 0x80) {
-                    *out++ = static_cast<char>(*in);
-                } else {
-                    *out++ = static_cast<char>(0xC0 | (*in >> 6));
-                    *out++ = static_cast<char>(0x80 | (*in & 0x3F));
-                }
-            }
-            break;
+            return StringFromLatin1ToUTF8(source, target, length);  // the same bytes, by the vector code
         case CHARSET_EUCJP:
             while (*in) {
                 uint8_t count = 0;

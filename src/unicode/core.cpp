@@ -1,6 +1,10 @@
 // UTF-8 <-> UTF-16: the scalar reference loops and the exported wrappers.
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "textconv.h"
 #include "unicode/utf_internal.h"
 #include "unicode/utf_scalar.h"
@@ -42,6 +46,39 @@ size_t units_before_terminator(const uint16_t *s) {
     size_t n = 0;
     while (s[n] != 0) ++n;
     return n;
+}
+
+bool holds_replacement(const uint16_t *units, uint32_t n) {
+    uint32_t k = 0;
+#if defined(__SSE2__)
+    const __m128i replacement = _mm_set1_epi16(static_cast<short>(kReplacementCharacter));
+    __m128i seen = _mm_setzero_si128();
+    for (; n - k >= 8; k += 8)
+        seen = _mm_or_si128(
+            seen,
+            _mm_cmpeq_epi16(_mm_loadu_si128(reinterpret_cast<const __m128i *>(units + k)), replacement));
+    if (_mm_movemask_epi8(seen) != 0) return true;
+#endif
+    for (; k < n; ++k)
+        if (units[k] == kReplacementCharacter) return true;
+    return false;
+}
+
+// A list decoded in one pass: each NUL becomes the 0 unit after its string.
+// This equals decoding string by string unless a string ends inside a
+// sequence, whose cut bytes then give U+FFFD instead of failing the list; so
+// the pass counts only when its output holds no U+FFFD. (Text with real
+// U+FFFD in it takes the string-by-string road, to the same result.)
+bool decode_list_whole(const uint8_t *in, uint32_t len, uint16_t *out, uint32_t size, uint32_t &written) {
+    uint32_t w = 0;
+    if (utf8_to_utf16(in, len, out, size, &w) != TEXTCONV_UTF_DONE) return false;
+    if (holds_replacement(out, w / 2)) return false;
+    written = w;
+    if (len > 0 && in[len - 1] != 0) {  // the last string's 0 unit
+        out[w / 2] = 0;
+        written += 2;
+    }
+    return true;
 }
 
 }  // namespace
@@ -128,6 +165,7 @@ TEXTCONV_API int StringListFromUTF8toUTF16(char **list, uint32_t *length) {
     auto *out = static_cast<uint16_t *>(HostMalloc(size, 1));
     if (out == nullptr) return 0;
     uint32_t i = 0, o = 0;
+    if (decode_list_whole(in, len, out, size, o)) i = len;
     while (i < len) {
         const void *nul = std::memchr(in + i, 0, len - i);
         const uint32_t end = nul ? static_cast<uint32_t>(static_cast<const uint8_t *>(nul) - in) : len;

@@ -2,7 +2,9 @@
 // input rules, and every capacity and cut point.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
+#include <random>
 #include <string>
 #include <vector>
 
@@ -289,6 +291,39 @@ TEST(StringListFromUTF8toUTF16, ListsAndTerminators) {
         ASSERT_EQ(ok, 1) << hex(in);
         EXPECT_NE(list, input.data());
         EXPECT_EQ(hex(units_of(list, len)), hex(out));
+        HostFree(list);
+    }
+}
+
+// Random lists against decoding string by string: strings cut inside a
+// sequence (the list fails), ill-formed bytes and real U+FFFD among them.
+TEST(StringListFromUTF8toUTF16, RandomListsMatchStringByString) {
+    std::mt19937 rng(3);
+    const std::string damage[] = {"\xEF\xBF\xBD", "\xE3\x81", "\xC3", "\xFF", "\x80", "\xF0\x9F\x98", ""};
+    for (uint32_t seed = 1; seed <= 400; ++seed) {
+        std::string in;
+        std::u16string want;
+        bool fails = false;
+        for (uint32_t k = 0, strings = 1 + rng() % 6; k < strings; ++k) {
+            std::string str =
+                testsupport::random_utf8(seed * 7 + k, rng() % 50) + damage[rng() % std::size(damage)];
+            str.erase(std::remove(str.begin(), str.end(), '\0'), str.end());
+            std::u16string units(str.size() + 1, u'\0');
+            uint32_t w = 0;
+            fails |= ConvertUTF8toUTF16(str.data(), static_cast<uint32_t>(str.size()),
+                                        reinterpret_cast<uint16_t *>(units.data()), 2 * str.size() + 2,
+                                        &w) != TEXTCONV_UTF_DONE;
+            want += units.substr(0, w / 2) + u'\0';
+            in += str;
+            if (k + 1 < strings || rng() % 2) in += '\0';
+        }
+        std::string input = in + 'x';
+        char *list = input.data();
+        uint32_t len = static_cast<uint32_t>(in.size());
+        const int ok = StringListFromUTF8toUTF16(&list, &len);
+        ASSERT_EQ(ok, fails ? 0 : 1) << hex(in);
+        if (!ok) continue;
+        EXPECT_EQ(hex(units_of(list, len)), hex(want));
         HostFree(list);
     }
 }
