@@ -146,8 +146,9 @@ char *units_to_single_byte(CharsetId charset, const uint16_t *units, uint32_t co
     return o;
 }
 
-// Text is decoded in chunks of at most this many bytes (as many units).
-constexpr uint32_t kChunk = 256;
+// Text is decoded in chunks of at most this many bytes (as many units, 2 KiB
+// of stack): long enough that the vector decoder works on whole blocks.
+constexpr uint32_t kChunk = 1024;
 
 // Where a chunk from p may end so that it decodes on its own exactly as
 // within the whole text: at the end, or just after an ASCII byte (a sequence
