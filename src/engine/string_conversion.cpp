@@ -85,13 +85,20 @@ size_t unit_string_bytes(const char *text) {
 
 // Whether the first unit of a pass's output is the converter's byte-order
 // mark, to be removed. A UTF-8 source that begins with EF BB BF brings its
-// own U+FEFF: that one is text, unless the converter wrote a mark before it.
+// own U+FEFF, which is text: the output then starts with the converter's
+// mark only when it holds more leading U+FEFF units than the source has
+// leading marks (a text that opens with two marks keeps both).
 bool starts_with_converter_mark(CharsetId charset, const char *passSource, const char *output,
                                 size_t written) {
     if (written < 2 || unit_at(output, 0) != kByteOrderMark) return false;
-    const auto *s = reinterpret_cast<const unsigned char *>(passSource);
-    const bool sourceMark = charset == CHARSET_UTF8 && s[0] == 0xEF && s[1] == 0xBB && s[2] == 0xBF;
-    return !sourceMark || (written >= 4 && unit_at(output, 1) == kByteOrderMark);
+    if (charset != CHARSET_UTF8) return true;
+    size_t sourceMarks = 0;  // byte by byte: nothing past the terminator is read
+    for (const auto *s = reinterpret_cast<const unsigned char *>(passSource);
+         s[0] == 0xEF && s[1] == 0xBB && s[2] == 0xBF; s += 3)
+        ++sourceMarks;
+    size_t outputMarks = 0;
+    while (outputMarks < written / 2 && unit_at(output, outputMarks) == kByteOrderMark) ++outputMarks;
+    return outputMarks > sourceMarks;
 }
 
 // Converts a "?" unit at out; returns the bytes written (the converter's

@@ -83,10 +83,20 @@ TEST(EngineMarks, SecondMarkSetsTheFlagAndLaterCallsLeaveTheTerminatorOut) {
     EXPECT_EQ(std::tuple(tight.result, tight.length, tight.guardIntact), std::tuple(0, 10u, true));
 }
 
+// A UTF-8 text's own marks are text, however many open it: with glibc's
+// mark on the first output only, the first call and the later ones agree.
+TEST(EngineMarks, SourceMarksAreKeptEveryOne) {
+    for (int call = 0; call < 3; ++call) {
+        EXPECT_EQ(to_unicode(CHARSET_UTF8, "\xEF\xBB\xBF\xEF\xBB\xBF\x41").units(), z(u"\xFEFF\xFEFF\x41"));
+        EXPECT_EQ(to_unicode(CHARSET_UTF8, "\xEF\xBB\xBF\x41").units(), z(u"\xFEFF\x41"));
+    }
+}
+
 TEST(EngineMarks, UnitsWrittenWithAMarkEveryCall) {
     shim::markEveryCall = true;
-    // The converter's mark goes, a UTF-8 source's own mark stays.
+    // The converter's mark goes, a UTF-8 source's own marks stay.
     EXPECT_EQ(to_unicode(CHARSET_UTF8, "\xEF\xBB\xBF\x41").units(), z(u"\xFEFF\x41"));
+    EXPECT_EQ(to_unicode(CHARSET_UTF8, "\xEF\xBB\xBF\xEF\xBB\xBF\x41").units(), z(u"\xFEFF\xFEFF\x41"));
     EXPECT_EQ(decode_char(CHARSET_UTF8, "\xE2\x82\xAC"), Char(1, 0x20AC, 3));
     EXPECT_EQ(decode_char(CHARSET_UTF8, "\xEF\xBB\xBF"), Char(1, 0xFEFF, 3));
     EXPECT_EQ(decode_char(CHARSET_UTF8, "\xFF"), Char(1, 0xFFFD, 1));
