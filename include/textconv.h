@@ -230,7 +230,7 @@ TEXTCONV_API int StringFromUnicodeToCharset(CharsetId charset, const uint16_t **
 /* NUL-terminated text in charset (0-terminated 16-bit units for the UTF-16
  * ids) at *source to 0-terminated UTF-16 at *destination. Each undecodable
  * byte (unit, for the UTF-16 ids) becomes U+FFFD; the converter's byte-order
- * mark is removed (a UTF-8 source's own leading mark is kept). *length in:
+ * mark is removed (a UTF-8 source's own leading marks are kept). *length in:
  * room in bytes, 2 x (characters + 1) suffices; out on success: bytes written
  * including the terminator. Once a converter's mark has twice taken the
  * terminator's room, the process stores every terminator itself and leaves
