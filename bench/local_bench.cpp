@@ -101,6 +101,22 @@ void utf8_to_local_iconv(benchmark::State &state, const std::string &corpus) {
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
 }
 
+// The least work any UTF-8 decoder does on the same text: ICU's u_strFromUTF8.
+void utf8_to_local_icu_utf16(benchmark::State &state, const std::string &corpus) {
+    const std::string text = fitting_utf8(corpus);
+    std::vector<UChar> out(text.size() + 8);
+    for (auto _ : state) {
+        int32_t n = 0;
+        UErrorCode err = U_ZERO_ERROR;
+        u_strFromUTF8(out.data(), static_cast<int32_t>(out.size()), &n, text.data(),
+                      static_cast<int32_t>(text.size()), &err);
+        if (U_FAILURE(err)) state.SkipWithError("ICU failed");
+        benchmark::DoNotOptimize(n);
+        benchmark::ClobberMemory();
+    }
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
+
 void utf8_to_local_icu(benchmark::State &state, const std::string &corpus) {
     const std::string text = fitting_utf8(corpus);
     UErrorCode err = U_ZERO_ERROR;
@@ -136,6 +152,7 @@ void utf8_to_local_icu(benchmark::State &state, const std::string &corpus) {
     register_per_corpus("UTF8toLocal/textconv", ".utf8.txt", utf8_to_local_textconv);
     register_per_corpus("UTF8toLocal/iconv", ".utf8.txt", utf8_to_local_iconv);
     register_per_corpus("UTF8toLocal/icu", ".utf8.txt", utf8_to_local_icu);
+    register_per_corpus("UTF8toLocal/icu-utf16", ".utf8.txt", utf8_to_local_icu_utf16);
     return true;
 }();
 
