@@ -4,6 +4,7 @@
 #include <benchmark/benchmark.h>
 #include <dirent.h>
 #include <sys/stat.h>
+#include <unicode/ustring.h>
 
 #include <algorithm>
 #include <cstdlib>
@@ -15,6 +16,22 @@
 #include <vector>
 
 namespace benchsupport {
+
+// ICU's u_strFromUTF8 of text into a buffer allocated once: the baseline
+// UTF-8 decoder.
+inline void icu_from_utf8(benchmark::State &state, const std::string &text) {
+    std::vector<UChar> out(text.size() + 8);
+    for (auto _ : state) {
+        int32_t n = 0;
+        UErrorCode err = U_ZERO_ERROR;
+        u_strFromUTF8(out.data(), static_cast<int32_t>(out.size()), &n, text.data(),
+                      static_cast<int32_t>(text.size()), &err);
+        if (U_FAILURE(err)) state.SkipWithError("ICU failed");
+        benchmark::DoNotOptimize(n);
+        benchmark::ClobberMemory();
+    }
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+}
 
 // The folder of real text: $TEXTCONV_CORPORA, else the one compiled in; ""
 // when it is not there (the benchmarks that need it then skip).

@@ -28,20 +28,6 @@ void equivalent_textconv(benchmark::State &state, const std::string &text) {
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
 }
 
-void equivalent_icu(benchmark::State &state, const std::string &text) {
-    std::vector<UChar> out(text.size() + 8);
-    for (auto _ : state) {
-        int32_t n = 0;
-        UErrorCode err = U_ZERO_ERROR;
-        u_strFromUTF8(out.data(), static_cast<int32_t>(out.size()), &n, text.data(),
-                      static_cast<int32_t>(text.size()), &err);
-        if (U_FAILURE(err)) state.SkipWithError("ICU failed");
-        benchmark::DoNotOptimize(n);
-        benchmark::ClobberMemory();
-    }
-    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
-}
-
 // The text cut down to what the local charset holds (glibc drops the rest),
 // back in UTF-8: input that both sides convert without substitutes.
 std::string fitting_utf8(const std::string &text) {
@@ -104,17 +90,7 @@ void utf8_to_local_iconv(benchmark::State &state, const std::string &corpus) {
 // The least work any UTF-8 decoder does on the same text: ICU's u_strFromUTF8.
 void utf8_to_local_icu_utf16(benchmark::State &state, const std::string &corpus) {
     const std::string text = fitting_utf8(corpus);
-    std::vector<UChar> out(text.size() + 8);
-    for (auto _ : state) {
-        int32_t n = 0;
-        UErrorCode err = U_ZERO_ERROR;
-        u_strFromUTF8(out.data(), static_cast<int32_t>(out.size()), &n, text.data(),
-                      static_cast<int32_t>(text.size()), &err);
-        if (U_FAILURE(err)) state.SkipWithError("ICU failed");
-        benchmark::DoNotOptimize(n);
-        benchmark::ClobberMemory();
-    }
-    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
+    benchsupport::icu_from_utf8(state, text);
 }
 
 void utf8_to_local_icu(benchmark::State &state, const std::string &corpus) {
@@ -148,7 +124,7 @@ void utf8_to_local_icu(benchmark::State &state, const std::string &corpus) {
 
 [[maybe_unused]] const bool registered = [] {
     register_per_corpus("Equivalent/textconv", ".utf8.txt", equivalent_textconv);
-    register_per_corpus("Equivalent/icu", ".utf8.txt", equivalent_icu);
+    register_per_corpus("Equivalent/icu", ".utf8.txt", benchsupport::icu_from_utf8);
     register_per_corpus("UTF8toLocal/textconv", ".utf8.txt", utf8_to_local_textconv);
     register_per_corpus("UTF8toLocal/iconv", ".utf8.txt", utf8_to_local_iconv);
     register_per_corpus("UTF8toLocal/icu", ".utf8.txt", utf8_to_local_icu);

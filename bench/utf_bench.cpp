@@ -62,20 +62,6 @@ void utf8_to_utf16_textconv(benchmark::State &state, const std::string &text) {
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
 }
 
-void utf8_to_utf16_icu(benchmark::State &state, const std::string &text) {
-    std::vector<UChar> out(text.size() + 8);
-    for (auto _ : state) {
-        int32_t n = 0;
-        UErrorCode err = U_ZERO_ERROR;
-        u_strFromUTF8(out.data(), static_cast<int32_t>(out.size()), &n, text.data(),
-                      static_cast<int32_t>(text.size()), &err);
-        if (U_FAILURE(err)) state.SkipWithError("ICU failed");
-        benchmark::DoNotOptimize(n);
-        benchmark::ClobberMemory();
-    }
-    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * text.size()));
-}
-
 void utf8_to_utf16_iconv(benchmark::State &state, const std::string &text) {
     iconv_run(state, "UTF-16LE", "UTF-8", text.data(), text.size(), text.size() * 2 + 16);
 }
@@ -203,7 +189,7 @@ void latin1_local_textconv(benchmark::State &state, const std::string &text) {
 
 [[maybe_unused]] const bool registered = [] {
     register_per_corpus("UTF8toUTF16/textconv", ".utf8.txt", utf8_to_utf16_textconv);
-    register_per_corpus("UTF8toUTF16/icu", ".utf8.txt", utf8_to_utf16_icu);
+    register_per_corpus("UTF8toUTF16/icu", ".utf8.txt", benchsupport::icu_from_utf8);
     register_per_corpus("UTF8toUTF16/iconv", ".utf8.txt", utf8_to_utf16_iconv);
     register_per_corpus("UTF8toUTF16/string", ".utf8.txt", utf8_string_textconv);
     register_per_corpus("UTF8toUTF16/list", ".utf8.txt", utf8_list_textconv);

@@ -62,11 +62,7 @@ std::string variant(const std::string &text, fuzz::Reader &in) {
 }  // namespace
 
 extern "C" int LLVMFuzzerInitialize(int *, char ***) {
-    if (const char *name = std::getenv("TEXTCONV_FUZZ_LOCALE")) {
-        setenv("LANG", name, 1);
-        setenv("LC_ALL", name, 1);
-    }
-    local = LocalEncoding();
+    local = fuzz::adopt_fuzz_locale();
     return 0;
 }
 

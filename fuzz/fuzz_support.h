@@ -71,6 +71,16 @@ class Reader {
 };
 
 // Bytes with no NUL inside, so they can stand as a C string.
+// The process takes the locale named by TEXTCONV_FUZZ_LOCALE (if any) and
+// returns the local encoding it then has.
+inline CharsetId adopt_fuzz_locale() {
+    if (const char *name = std::getenv("TEXTCONV_FUZZ_LOCALE")) {
+        setenv("LANG", name, 1);
+        setenv("LC_ALL", name, 1);
+    }
+    return LocalEncoding();
+}
+
 inline std::string without_nul(std::string s) {
     for (char &c : s)
         if (c == 0) c = 1;

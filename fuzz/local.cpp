@@ -187,11 +187,7 @@ void lists_and_host_strings(fuzz::Reader &in) {
 }  // namespace
 
 extern "C" int LLVMFuzzerInitialize(int *, char ***) {
-    if (const char *name = std::getenv("TEXTCONV_FUZZ_LOCALE")) {
-        setenv("LANG", name, 1);
-        setenv("LC_ALL", name, 1);
-    }
-    local = LocalEncoding();
+    local = fuzz::adopt_fuzz_locale();
     FUZZ_CHECK(local > CHARSET_NONE && local < CHARSET_COUNT);
     std::fprintf(stderr, "local encoding: %d (%s)\n", local, charsetConversion[local].iconvName);
     return 0;

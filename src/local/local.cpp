@@ -36,8 +36,8 @@ constexpr bool is_single_byte(CharsetId charset) {
 UnitByteTable unitTable;
 
 bool converter_open(CharsetId charset) {
-    const textconv::ConverterCell cell = textconv::fromUnicodeConverters[charset];
-    return cell != textconv::unopened_cell() && cell != textconv::failed_cell();
+    const ConverterCell cell = fromUnicodeConverters[charset];
+    return cell != unopened_cell() && cell != failed_cell();
 }
 
 // FromUnicodeToCharset for a unit of a single-byte charset that the table
@@ -105,19 +105,10 @@ inline int sequence_to_local(const uint8_t *s, uint32_t n, uint32_t &p, char *&o
 }
 
 // One unit of a single-byte charset at o, "?" when it has no byte; returns
-// the position after it. (Pointers are passed by value here: a char store
-// through a pointer held in memory would make the compiler reload it.)
+// the position after it. (The loops keep their output pointer in a local:
+// a char store through a pointer held in memory makes the compiler reload it.)
 inline char *put_unit(CharsetId charset, uint16_t unit, char *o, int &result) {
-    const int known = unitTable.find(unit);
-    if (known >= 0 && known != UnitByteTable::kNoByte) {
-        *o = static_cast<char>(known);
-        return o + 1;
-    }
-    if (known == UnitByteTable::kUnknown) {
-        char *after = o;
-        if (ask_converter(charset, unit, &after)) return after;
-        o = after;
-    }
+    if (single_byte_unit(charset, unit, &o)) return o;
     *o = '?';
     result = 0;
     return o + 1;
